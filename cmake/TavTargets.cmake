@@ -1,0 +1,48 @@
+# Shared build rules: warnings, sanitizers, and the helpers every subsystem
+# folder uses so that adding a source or test file needs no CMake edit.
+
+add_library(tav_options INTERFACE)
+target_compile_options(tav_options INTERFACE -Wall -Wextra -Werror)
+target_include_directories(tav_options INTERFACE ${PROJECT_SOURCE_DIR}/src)
+
+if(TAV_SANITIZE)
+  target_compile_options(tav_options INTERFACE
+    -fsanitize=address,undefined -fno-sanitize-recover=undefined -fno-omit-frame-pointer)
+  target_link_options(tav_options INTERFACE -fsanitize=address,undefined)
+endif()
+
+if(TAV_FUZZ)
+  if(NOT CMAKE_CXX_COMPILER_ID MATCHES "Clang")
+    message(FATAL_ERROR "TAV_FUZZ needs clang (libFuzzer)")
+  endif()
+  target_compile_options(tav_options INTERFACE
+    -fsanitize=fuzzer-no-link,address,undefined -fno-sanitize-recover=undefined -fno-omit-frame-pointer)
+  target_link_options(tav_options INTERFACE -fsanitize=address,undefined)
+endif()
+
+# tav_subsystem(NAME DEPS ...): builds every non-test .cpp of the calling
+# folder into the static library NAME and every *_test.cpp into NAME_tests,
+# registered with ctest.
+function(tav_subsystem name)
+  cmake_parse_arguments(ARG "" "" "DEPS;TEST_DEPS" ${ARGN})
+  file(GLOB all_sources CONFIGURE_DEPENDS ${CMAKE_CURRENT_SOURCE_DIR}/*.cpp)
+  set(lib_sources ${all_sources})
+  list(FILTER lib_sources EXCLUDE REGEX "_test\\.cpp$")
+  set(test_sources ${all_sources})
+  list(FILTER test_sources INCLUDE REGEX "_test\\.cpp$")
+
+  if(lib_sources)
+    add_library(${name} STATIC ${lib_sources})
+    target_link_libraries(${name} PUBLIC tav_options ${ARG_DEPS})
+  else()
+    add_library(${name} INTERFACE)
+    target_link_libraries(${name} INTERFACE tav_options ${ARG_DEPS})
+  endif()
+
+  if(TAV_TESTS AND test_sources)
+    add_executable(${name}_tests ${test_sources})
+    target_link_libraries(${name}_tests PRIVATE ${name} ${ARG_TEST_DEPS} GTest::gmock GTest::gtest_main)
+    gtest_discover_tests(${name}_tests DISCOVERY_TIMEOUT 60
+      PROPERTIES ENVIRONMENT "TAV_SOURCE_DIR=${PROJECT_SOURCE_DIR};TAV_TESTDATA_DIR=${PROJECT_SOURCE_DIR}/../shared/testdata")
+  endif()
+endfunction()
