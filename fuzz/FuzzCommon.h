@@ -8,12 +8,12 @@
 
 #include "support/Error.h"
 
-#define TAV_FUZZ_TARGET(body)                                                   \
-  extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {     \
-    std::string_view input(reinterpret_cast<const char*>(data), size);          \
-    try {                                                                       \
-      body;                                                                     \
-    } catch (const tav::Error&) {                                               \
-    }                                                                           \
-    return 0;                                                                   \
+#define TAV_FUZZ_TARGET(body)                                               \
+  extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) { \
+    std::string_view input(reinterpret_cast<const char*>(data), size);      \
+    try {                                                                   \
+      body;                                                                 \
+    } catch (const tav::Error&) {                                           \
+    }                                                                       \
+    return 0;                                                               \
   }

@@ -24,7 +24,8 @@ std::vector<RegisteredGroup>& CommandGroups() {
 
 int main(int argc, char** argv) {
   using namespace tav::showctl;
-  CLI::App app{"showctl - make schedules, inspect sequences, edit settings and control the show player"};
+  CLI::App app{
+      "showctl - make schedules, inspect sequences, edit settings and control the show player"};
   app.require_subcommand(1);
   app.set_version_flag("--version", "showctl 0.1.0");
   auto& groups = CommandGroups();

@@ -41,7 +41,9 @@ Civil CivilFromDays(int64_t z) {
   return {y + (m <= 2), m, d};
 }
 
-bool IsLeap(int64_t y) { return (y % 4 == 0 && y % 100 != 0) || y % 400 == 0; }
+bool IsLeap(int64_t y) {
+  return (y % 4 == 0 && y % 100 != 0) || y % 400 == 0;
+}
 
 int DaysInMonth(int64_t y, int m) {
   static const int kDays[] = {31, 28, 31, 30, 31, 30, 31, 31, 30, 31, 30, 31};
@@ -190,13 +192,27 @@ DateTime DateTime::FromLinearMilliseconds(int64_t ms) {
   return DateTime(static_cast<double>(days) - fraction);
 }
 
-int DateTime::Year() const { return static_cast<int>(CivilFromDays(Split().days + kSerialEpochOffset).year); }
-int DateTime::Month() const { return static_cast<int>(CivilFromDays(Split().days + kSerialEpochOffset).month); }
-int DateTime::Day() const { return static_cast<int>(CivilFromDays(Split().days + kSerialEpochOffset).day); }
-int DateTime::Hour() const { return Split().seconds / 3600; }
-int DateTime::Minute() const { return Split().seconds / 60 % 60; }
-int DateTime::Second() const { return Split().seconds % 60; }
-int DateTime::SecondOfDay() const { return Split().seconds; }
+int DateTime::Year() const {
+  return static_cast<int>(CivilFromDays(Split().days + kSerialEpochOffset).year);
+}
+int DateTime::Month() const {
+  return static_cast<int>(CivilFromDays(Split().days + kSerialEpochOffset).month);
+}
+int DateTime::Day() const {
+  return static_cast<int>(CivilFromDays(Split().days + kSerialEpochOffset).day);
+}
+int DateTime::Hour() const {
+  return Split().seconds / 3600;
+}
+int DateTime::Minute() const {
+  return Split().seconds / 60 % 60;
+}
+int DateTime::Second() const {
+  return Split().seconds % 60;
+}
+int DateTime::SecondOfDay() const {
+  return Split().seconds;
+}
 
 int DateTime::DayOfWeek() const {
   // 1899-12-30 was a Saturday.
@@ -204,7 +220,9 @@ int DateTime::DayOfWeek() const {
   return static_cast<int>(d < 0 ? d + 7 : d);
 }
 
-DateTime DateTime::DateOnly() const { return DateTime(static_cast<double>(Split().days)); }
+DateTime DateTime::DateOnly() const {
+  return DateTime(static_cast<double>(Split().days));
+}
 
 DateTime DateTime::AddSeconds(int64_t seconds) const {
   return FromLinearMilliseconds(LinearMilliseconds() + seconds * 1000);

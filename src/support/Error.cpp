@@ -13,7 +13,9 @@ namespace errors {
 Error InvalidProcedureCall(std::string source) {
   return Error(kInvalidProcedureCall, std::move(source), "Invalid procedure call or argument");
 }
-Error Overflow(std::string source) { return Error(kOverflow, std::move(source), "Overflow"); }
+Error Overflow(std::string source) {
+  return Error(kOverflow, std::move(source), "Overflow");
+}
 Error SubscriptOutOfRange(std::string source) {
   return Error(kSubscriptOutOfRange, std::move(source), "Subscript out of range");
 }
@@ -21,8 +23,7 @@ Error TypeMismatch(std::string source) {
   return Error(kTypeMismatch, std::move(source), "Type mismatch");
 }
 Error ObjectNotSet(std::string source) {
-  return Error(kObjectNotSet, std::move(source),
-               "Object variable or With block variable not set");
+  return Error(kObjectNotSet, std::move(source), "Object variable or With block variable not set");
 }
 Error KeyAlreadyAssociated(std::string source) {
   return Error(kKeyAlreadyAssociated, std::move(source),

@@ -10,8 +10,12 @@
 namespace tav {
 namespace {
 
-bool IsBlank(char c) { return c == ' ' || c == '\t'; }
-bool IsDigit(char c) { return c >= '0' && c <= '9'; }
+bool IsBlank(char c) {
+  return c == ' ' || c == '\t';
+}
+bool IsDigit(char c) {
+  return c >= '0' && c <= '9';
+}
 
 // Length of the decimal number at the start of text (sign, digits, fraction,
 // exponent), or 0 when there is none.
@@ -95,7 +99,9 @@ int16_t ToInt16(double value) {
   return static_cast<int16_t>(rounded);
 }
 
-int32_t NumberOf(std::string_view text) { return ToInt32(LeadingNumber(text)); }
+int32_t NumberOf(std::string_view text) {
+  return ToInt32(LeadingNumber(text));
+}
 
 std::string SignedNumberText(int64_t value) {
   if (value < 0) return std::to_string(value);

@@ -8,15 +8,15 @@ namespace tav {
 namespace {
 
 TEST(Numbers, RoundHalfEven) {
-  const std::pair<double, double> cases[] = {{0.5, 0}, {1.5, 2},  {2.5, 2},   {-0.5, 0},
+  const std::pair<double, double> cases[] = {{0.5, 0},   {1.5, 2},   {2.5, 2},    {-0.5, 0},
                                              {-1.5, -2}, {-2.5, -2}, {2.4999, 2}, {2.5001, 3}};
   for (auto [in, out] : cases) EXPECT_EQ(RoundHalfEven(in), out) << in;
 }
 
 TEST(Numbers, LeadingNumberIsLenient) {
   const std::pair<const char*, double> cases[] = {
-      {"2", 2},    {"  -1", -1}, {"3abc", 3},   {"", 0},    {"abc", 0},
-      {"1.5e1x", 15}, {"+4", 4},   {".5", 0.5},  {"1e", 1},  {"-", 0}};
+      {"2", 2},       {"  -1", -1}, {"3abc", 3}, {"", 0},   {"abc", 0},
+      {"1.5e1x", 15}, {"+4", 4},    {".5", 0.5}, {"1e", 1}, {"-", 0}};
   for (auto [in, out] : cases) EXPECT_EQ(LeadingNumber(in), out) << in;
   EXPECT_EQ(NumberOf("2.5"), 2);
   EXPECT_EQ(NumberOf("3.5"), 4);

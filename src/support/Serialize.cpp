@@ -111,8 +111,8 @@ TextArray ListFromText(std::string_view text, int32_t lowerBound) {
 
   CharSearch opens(inner, '('), closes(inner, ')'), commas(inner, ',');
   std::vector<std::string> fields;
-  size_t base = 0;   // start of the current (uncut) inner text
-  size_t p = 0;      // search position
+  size_t base = 0;  // start of the current (uncut) inner text
+  size_t p = 0;     // search position
   int64_t depth = 0;
   bool restartedThisField = false;
 
@@ -180,7 +180,9 @@ std::string ListToText(const std::vector<std::string>& fields) {
   return out;
 }
 
-std::string ListToText(const TextArray& fields) { return ListToText(fields.Items()); }
+std::string ListToText(const TextArray& fields) {
+  return ListToText(fields.Items());
+}
 
 // ---- Escapes ---------------------------------------------------------------
 
@@ -189,11 +191,20 @@ std::string EscapeText(std::string_view text) {
   out.reserve(text.size());
   for (char c : text) {
     switch (c) {
-      case '*': out += "*E"; break;
-      case '(': out += "*O"; break;
-      case ')': out += "*C"; break;
-      case ',': out += "*S"; break;
-      default: out += c;
+      case '*':
+        out += "*E";
+        break;
+      case '(':
+        out += "*O";
+        break;
+      case ')':
+        out += "*C";
+        break;
+      case ',':
+        out += "*S";
+        break;
+      default:
+        out += c;
     }
   }
   return out;
@@ -229,7 +240,9 @@ std::string UnescapeText(std::string_view field) {
 
 // ---- Typed fields ----------------------------------------------------------
 
-std::string DateToText(DateTime value) { return EscapeText(value.ToText()); }
+std::string DateToText(DateTime value) {
+  return EscapeText(value.ToText());
+}
 
 DateTime DateFromText(std::string_view field) {
   auto value = DateTime::FromText(UnescapeText(field));
@@ -237,7 +250,9 @@ DateTime DateFromText(std::string_view field) {
   return *value;
 }
 
-std::string LongToText(int32_t value) { return EscapeText(SignedNumberText(value)); }
+std::string LongToText(int32_t value) {
+  return EscapeText(SignedNumberText(value));
+}
 
 int32_t LongFromText(std::string_view field) {
   auto number = ParseNumber(UnescapeText(field));
@@ -250,7 +265,9 @@ int32_t LongFromText(std::string_view field) {
   return static_cast<int32_t>(down);
 }
 
-std::string BoolToText(bool value) { return value ? "T" : "F"; }
+std::string BoolToText(bool value) {
+  return value ? "T" : "F";
+}
 
 bool BoolFromText(std::string_view field) {
   std::string text = UnescapeText(field);
