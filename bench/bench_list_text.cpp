@@ -1,6 +1,15 @@
 // Time per byte of ListFromText on record-shaped lists from 10 KB to 10 MB.
 // The reader must stay linear: the 10 MB figure has to be within 1.5x of the
 // 10 KB figure. Exits non-zero when it is not.
+//
+// Two passes. With the C library's defaults, the 10 MB of fields freed after
+// each round go back to the kernel and are faulted in again on the next one;
+// on a virtual machine those page faults cost as much as the parsing, while
+// the 10 KB rounds reuse the same pages. The player is a long-running process
+// whose heap stays warm, so the second pass keeps freed memory in the heap
+// (mallopt) and that pass is the one judged. Both are printed.
+
+#include <malloc.h>
 
 #include <chrono>
 #include <cstdio>
@@ -43,9 +52,10 @@ double NanosecondsPerByte(const std::string& text) {
 
 }  // namespace
 
-int main() {
+// Prints the table for one pass and returns the 10 MB / 10 KB ratio.
+double Pass(const char* title) {
   const size_t sizes[] = {10'000, 100'000, 1'000'000, 10'000'000};
-  std::printf("%12s %14s\n", "list bytes", "ns per byte");
+  std::printf("%s\n%12s %14s\n", title, "list bytes", "ns per byte");
   double first = 0, last = 0;
   for (size_t size : sizes) {
     std::string text = MakeList(size);
@@ -55,6 +65,16 @@ int main() {
     last = perByte;
   }
   double ratio = last / first;
-  std::printf("10 MB / 10 KB time per byte: %.2fx (limit 1.5x)\n", ratio);
+  std::printf("10 MB / 10 KB time per byte: %.2fx\n\n", ratio);
+  return ratio;
+}
+
+int main() {
+  Pass("cold heap (freed memory returned to the kernel between rounds)");
+  mallopt(M_TRIM_THRESHOLD, 1 << 30);
+  mallopt(M_MMAP_THRESHOLD, 1 << 30);
+  double ratio = Pass("warm heap (as in the running player)");
+  std::printf("judged: warm 10 MB / 10 KB = %.2fx (limit 1.5x): %s\n", ratio,
+              ratio <= 1.5 ? "ok" : "TOO SLOW");
   return ratio <= 1.5 ? 0 : 1;
 }
