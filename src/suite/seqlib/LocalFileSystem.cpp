@@ -1,0 +1,129 @@
+// The real file system through POSIX calls.
+
+#include <dirent.h>
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstring>
+
+#include "suite/seqlib/FileSystem.h"
+#include "suite/seqlib/SeqErrors.h"
+
+namespace tav {
+
+namespace {
+
+class LocalFile : public RandomAccessFile {
+ public:
+  LocalFile(int fd, uint64_t size, std::string name)
+      : m_fd(fd), m_size(size), m_name(std::move(name)) {}
+  ~LocalFile() override { ::close(m_fd); }
+  LocalFile(const LocalFile&) = delete;
+  LocalFile& operator=(const LocalFile&) = delete;
+
+  uint64_t Size() const override { return m_size; }
+  const std::string& Name() const override { return m_name; }
+
+  size_t ReadAt(uint64_t offset, void* buffer, size_t count) const override {
+    size_t done = 0;
+    auto* out = static_cast<char*>(buffer);
+    while (done < count) {
+      ssize_t n = ::pread(m_fd, out + done, count - done, static_cast<off_t>(offset + done));
+      if (n < 0) {
+        if (errno == EINTR) continue;
+        throw seqerrors::FileAccess("FileSystem.ReadAt", m_name + ": " + std::strerror(errno));
+      }
+      if (n == 0) break;
+      done += static_cast<size_t>(n);
+    }
+    return done;
+  }
+
+ private:
+  int m_fd;
+  uint64_t m_size;
+  std::string m_name;
+};
+
+class LocalFileSystemImpl : public FileSystem {
+ public:
+  FileStatus Stat(const std::string& path) const override {
+    FileStatus status;
+    struct stat st {};
+    if (path.empty() || ::stat(path.c_str(), &st) != 0) return status;
+    status.exists = true;
+    status.isDirectory = S_ISDIR(st.st_mode);
+    status.modifiedNs = static_cast<int64_t>(st.st_mtim.tv_sec) * 1000000000 + st.st_mtim.tv_nsec;
+    status.size = static_cast<uint64_t>(st.st_size);
+    return status;
+  }
+
+  std::unique_ptr<RandomAccessFile> OpenForRead(const std::string& path) const override {
+    int fd = ::open(path.c_str(), O_RDONLY | O_CLOEXEC);
+    if (fd < 0) {
+      if (errno == ENOENT || errno == ENOTDIR)
+        throw seqerrors::FileNotFound("FileSystem.OpenForRead", path);
+      throw seqerrors::FileAccess("FileSystem.OpenForRead", path + ": " + std::strerror(errno));
+    }
+    struct stat st {};
+    if (::fstat(fd, &st) != 0 || S_ISDIR(st.st_mode)) {
+      ::close(fd);
+      throw seqerrors::FileAccess("FileSystem.OpenForRead", path + ": not a readable file");
+    }
+    return std::make_unique<LocalFile>(fd, static_cast<uint64_t>(st.st_size), path);
+  }
+
+  void WriteAll(const std::string& path, std::string_view bytes) override {
+    std::string temp = path + ".tmp" + std::to_string(::getpid());
+    int fd = ::open(temp.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0644);
+    if (fd < 0) {
+      throw seqerrors::FileAccess("FileSystem.WriteAll", path + ": " + std::strerror(errno));
+    }
+    size_t done = 0;
+    while (done < bytes.size()) {
+      ssize_t n = ::write(fd, bytes.data() + done, bytes.size() - done);
+      if (n < 0) {
+        if (errno == EINTR) continue;
+        int err = errno;
+        ::close(fd);
+        ::unlink(temp.c_str());
+        throw seqerrors::FileAccess("FileSystem.WriteAll", path + ": " + std::strerror(err));
+      }
+      done += static_cast<size_t>(n);
+    }
+    if (::close(fd) != 0 || ::rename(temp.c_str(), path.c_str()) != 0) {
+      int err = errno;
+      ::unlink(temp.c_str());
+      throw seqerrors::FileAccess("FileSystem.WriteAll", path + ": " + std::strerror(err));
+    }
+  }
+
+  std::vector<std::string> ListDirectory(const std::string& path) const override {
+    std::vector<std::string> names;
+    DIR* dir = ::opendir(path.c_str());
+    if (dir == nullptr) return names;
+    while (dirent* entry = ::readdir(dir)) {
+      std::string name = entry->d_name;
+      if (name != "." && name != "..") names.push_back(std::move(name));
+    }
+    ::closedir(dir);
+    return names;
+  }
+};
+
+}  // namespace
+
+std::string FileSystem::ReadAll(const std::string& path) const {
+  auto file = OpenForRead(path);
+  std::string bytes(file->Size(), '\0');
+  ReadExactly(*file, 0, bytes.data(), bytes.size(), "FileSystem.ReadAll", "the whole file");
+  return bytes;
+}
+
+std::shared_ptr<FileSystem> LocalFileSystem() {
+  return std::make_shared<LocalFileSystemImpl>();
+}
+
+}  // namespace tav
