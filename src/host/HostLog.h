@@ -1,0 +1,47 @@
+#pragma once
+// The player's log. There is no log file: every line goes to the tray
+// program as a log message, and while no tray is known lines are held back
+// in a bounded buffer that is sent in one piece once a tray introduces itself.
+// A line is the time of day, ": ", the text and, for a sequence, " ", its
+// play-type name, ": " and its file name. Trace lines (level 0 or less) are
+// composed and discarded.
+//
+// Owned by the host; takes the clock for the time of day and the outbox that
+// knows the tray window. Logging never fails towards the caller.
+
+#include <cstdint>
+#include <string>
+#include <string_view>
+
+#include "host/HostServices.h"
+#include "host/PendingLog.h"
+#include "host/TrayOutbox.h"
+#include "platform/Clock.h"
+
+namespace tav {
+
+// "Null", "Background", ... "Shutdown" for 0 to 7; "(n)" for any other n.
+std::string PlayTypeName(int32_t playType);
+
+// The log line for `szText` at the time of day of `now`.
+std::string ComposeLogLine(DateTime now, std::string_view szText, const SequenceIdentity* seqInfo);
+
+class HostLog : public MessageLog {
+ public:
+  HostLog(const Clock& clock, TrayOutbox& outbox) : m_clock(clock), m_outbox(outbox) {}
+
+  void LogMessage(int32_t level, const std::string& szText,
+                  const SequenceIdentity* seqInfo = nullptr) override;
+
+  // Sends the held-back lines as one log message when a tray is known.
+  void FlushPendingLog();
+
+  const PendingLog& Pending() const { return m_pendingLog; }
+
+ private:
+  const Clock& m_clock;
+  TrayOutbox& m_outbox;
+  PendingLog m_pendingLog;
+};
+
+}  // namespace tav
