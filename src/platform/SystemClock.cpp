@@ -1,0 +1,25 @@
+#include "platform/SystemClock.h"
+
+#include <chrono>
+#include <ctime>
+
+namespace tav {
+
+DateTime SystemClock::Now() const {
+  std::time_t now = std::time(nullptr);
+  std::tm local{};
+  localtime_r(&now, &local);
+  // localtime_r yields a leap second as :60; the serial date has no room for
+  // it, so it reads as :59.
+  int second = local.tm_sec > 59 ? 59 : local.tm_sec;
+  return DateTime::FromParts(local.tm_year + 1900, local.tm_mon + 1, local.tm_mday, local.tm_hour,
+                             local.tm_min, second);
+}
+
+uint32_t SystemClock::TickCount() const {
+  auto since = std::chrono::steady_clock::now().time_since_epoch();
+  auto ms = std::chrono::duration_cast<std::chrono::milliseconds>(since).count();
+  return static_cast<uint32_t>(static_cast<uint64_t>(ms));
+}
+
+}  // namespace tav
