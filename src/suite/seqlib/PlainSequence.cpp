@@ -1,0 +1,460 @@
+#include "suite/seqlib/PlainSequence.h"
+
+#include <nlohmann/json.hpp>
+
+#include <algorithm>
+#include <cctype>
+#include <cmath>
+
+#include "suite/seqlib/PlayEvent.h"
+#include "suite/seqlib/SeqErrors.h"
+
+namespace tav {
+
+namespace {
+
+using nlohmann::json;
+constexpr const char* kSource = "PlainSequence.Parse";
+
+// Walks the document with the JSON path of the value at hand, so every
+// complaint says where it is.
+class Walker {
+ public:
+  Walker(const std::string& name) : m_name(name) {}
+
+  [[noreturn]] void Fail(const std::string& path, const std::string& message) const {
+    throw seqerrors::InvalidFormat(kSource,
+                                   m_name + ": " + (path.empty() ? "" : path + ": ") + message);
+  }
+
+  const json& Member(const json& object, const std::string& path, const char* key) const {
+    auto it = object.find(key);
+    if (it == object.end()) Fail(path, std::string("missing \"") + key + "\"");
+    return *it;
+  }
+
+  const json* Optional(const json& object, const char* key) const {
+    auto it = object.find(key);
+    return it == object.end() ? nullptr : &*it;
+  }
+
+  int64_t Integer(const json& value, const std::string& path, int64_t low, int64_t high) const {
+    int64_t number = 0;
+    if (value.is_number_integer()) {
+      if (value.is_number_unsigned() && value.get<uint64_t>() > static_cast<uint64_t>(INT64_MAX)) {
+        Fail(path, "number is too large");
+      }
+      number = value.get<int64_t>();
+    } else if (value.is_number_float() && std::abs(value.get<double>()) < 9.0e15 &&
+               value.get<double>() == std::trunc(value.get<double>())) {
+      number = static_cast<int64_t>(value.get<double>());
+    } else {
+      Fail(path, "expected a whole number, found " + Describe(value));
+    }
+    if (number < low || number > high) {
+      Fail(path, std::to_string(number) + " is outside " + std::to_string(low) + "-" +
+                     std::to_string(high));
+    }
+    return number;
+  }
+
+  int64_t IntegerMember(const json& object, const std::string& path, const char* key, int64_t low,
+                        int64_t high) const {
+    return Integer(Member(object, path, key), path + "." + key, low, high);
+  }
+
+  int64_t IntegerOr(const json& object, const std::string& path, const char* key, int64_t low,
+                    int64_t high, int64_t fallback) const {
+    const json* value = Optional(object, key);
+    return value ? Integer(*value, path + "." + key, low, high) : fallback;
+  }
+
+  std::string Text(const json& value, const std::string& path) const {
+    if (!value.is_string()) Fail(path, "expected a text, found " + Describe(value));
+    return value.get<std::string>();
+  }
+
+  std::string TextOr(const json& object, const std::string& path, const char* key) const {
+    const json* value = Optional(object, key);
+    return value ? Text(*value, path + "." + key) : std::string();
+  }
+
+  const json& ObjectAt(const json& value, const std::string& path) const {
+    if (!value.is_object()) Fail(path, "expected an object, found " + Describe(value));
+    return value;
+  }
+
+  const json& ArrayAt(const json& value, const std::string& path) const {
+    if (!value.is_array()) Fail(path, "expected a list, found " + Describe(value));
+    return value;
+  }
+
+  static std::string Describe(const json& value) {
+    switch (value.type()) {
+      case json::value_t::null:
+        return "null";
+      case json::value_t::boolean:
+        return "true/false";
+      case json::value_t::string:
+        return "a text";
+      case json::value_t::array:
+        return "a list";
+      case json::value_t::object:
+        return "an object";
+      case json::value_t::number_float:
+        return "a fraction";
+      default:
+        return "a number";
+    }
+  }
+
+ private:
+  const std::string& m_name;
+};
+
+constexpr int64_t kMaxTime = int64_t{1} << 40;  // about 35 years of milliseconds
+constexpr int64_t kMaxInt = INT32_MAX;
+
+// The address of a channel: exactly one of the family keys.
+ChannelAddress ReadAddress(const Walker& w, const json& channel, const std::string& path) {
+  ChannelAddress a;
+  int found = 0;
+  if (const json* v = w.Optional(channel, "tav")) {
+    std::string p = path + ".tav";
+    w.ObjectAt(*v, p);
+    a = {kFamilyTAV, static_cast<int32_t>(w.IntegerMember(*v, p, "network", 1, kMaxInt)),
+         static_cast<int32_t>(w.IntegerMember(*v, p, "unit", 0, 255)),
+         static_cast<int32_t>(w.IntegerMember(*v, p, "circuit", 1, kMaxInt))};
+    ++found;
+  }
+  if (const json* v = w.Optional(channel, "x10")) {
+    std::string p = path + ".x10";
+    w.ObjectAt(*v, p);
+    const json& house = w.Member(*v, p, "house");
+    int32_t code = 0;
+    if (house.is_string()) {
+      std::string text = house.get<std::string>();
+      if (text.size() != 1 || std::toupper(static_cast<unsigned char>(text[0])) < 'A' ||
+          std::toupper(static_cast<unsigned char>(text[0])) > 'P') {
+        w.Fail(p + ".house", "house code \"" + text + "\" is not a letter A-P");
+      }
+      code = std::toupper(static_cast<unsigned char>(text[0])) - 'A' + 1;
+    } else {
+      code = static_cast<int32_t>(w.Integer(house, p + ".house", 1, 16));
+    }
+    a = {kFamilyX10, code, 0, static_cast<int32_t>(w.IntegerMember(*v, p, "unit", 1, 16))};
+    ++found;
+  }
+  if (const json* v = w.Optional(channel, "fennick")) {
+    std::string p = path + ".fennick";
+    w.ObjectAt(*v, p);
+    a = {kFamilyFennick, static_cast<int32_t>(w.IntegerMember(*v, p, "network", 1, kMaxInt)), 0,
+         static_cast<int32_t>(w.IntegerMember(*v, p, "channel", 1, kMaxInt))};
+    ++found;
+  }
+  if (const json* v = w.Optional(channel, "dmx")) {
+    std::string p = path + ".dmx";
+    w.ObjectAt(*v, p);
+    a = {kFamilyDMX, static_cast<int32_t>(w.IntegerMember(*v, p, "universe", 1, 63999)), 0,
+         static_cast<int32_t>(w.IntegerMember(*v, p, "slot", 1, 512))};
+    ++found;
+  }
+  if (found != 1) {
+    w.Fail(
+        path,
+        found == 0
+            ? "no address: give one of \"tav\", \"x10\", \"fennick\" or \"dmx\""
+            : "more than one address: give only one of \"tav\", \"x10\", \"fennick\" or \"dmx\"");
+  }
+  return a;
+}
+
+Effect ReadEffect(const Walker& w, const json& e, const std::string& path) {
+  w.ObjectAt(e, path);
+  Effect effect;
+  effect.atMs = w.IntegerMember(e, path, "at", 0, kMaxTime);
+  std::string typeName = w.Text(w.Member(e, path, "type"), path + ".type");
+  effect.type = EffectTypeFromName(typeName);
+  if (effect.type < 0) {
+    w.Fail(path + ".type",
+           "unknown effect \"" + typeName + "\" (expected set, fade, twinkle, shimmer or off)");
+  }
+  effect.durationMs = static_cast<int32_t>(w.IntegerOr(e, path, "duration", 0, kMaxInt, 0));
+  effect.priority = static_cast<int32_t>(w.IntegerOr(e, path, "priority", -kMaxInt, kMaxInt, 0));
+  switch (effect.type) {
+    case kEffectSet:
+      effect.startIntensity = effect.endIntensity =
+          static_cast<int32_t>(w.IntegerMember(e, path, "level", 0, 100));
+      break;
+    case kEffectFade:
+      effect.startIntensity = static_cast<int32_t>(w.IntegerMember(e, path, "from", 0, 100));
+      effect.endIntensity = static_cast<int32_t>(w.IntegerMember(e, path, "to", 0, 100));
+      break;
+    case kEffectTwinkle:
+    case kEffectShimmer:
+      effect.startIntensity = static_cast<int32_t>(w.IntegerOr(e, path, "from", 0, 100, 0));
+      effect.endIntensity = static_cast<int32_t>(w.IntegerOr(e, path, "to", 0, 100, 100));
+      break;
+    default:
+      break;
+  }
+  return effect;
+}
+
+uint8_t HexDigit(const Walker& w, char c, const std::string& path) {
+  if (c >= '0' && c <= '9') return static_cast<uint8_t>(c - '0');
+  if (c >= 'a' && c <= 'f') return static_cast<uint8_t>(c - 'a' + 10);
+  if (c >= 'A' && c <= 'F') return static_cast<uint8_t>(c - 'A' + 10);
+  w.Fail(path, std::string("'") + c + "' is not a hexadecimal digit");
+}
+
+LevelTrack ReadTrack(const Walker& w, const json& t, const std::string& path) {
+  w.ObjectAt(t, path);
+  LevelTrack track;
+  const json* dmx = w.Optional(t, "dmx");
+  const json* tav = w.Optional(t, "tav");
+  if ((dmx != nullptr) == (tav != nullptr)) w.Fail(path, "give exactly one of \"dmx\" or \"tav\"");
+  if (dmx) {
+    std::string p = path + ".dmx";
+    w.ObjectAt(*dmx, p);
+    track.family = kFamilyDMX;
+    track.network = static_cast<int32_t>(w.IntegerMember(*dmx, p, "universe", 1, 63999));
+    track.firstAddress = static_cast<int32_t>(w.IntegerMember(*dmx, p, "first_slot", 1, 512));
+    track.count = static_cast<int32_t>(w.IntegerMember(*dmx, p, "count", 1, 512));
+    if (track.firstAddress + track.count - 1 > 512) {
+      w.Fail(p, "slots " + std::to_string(track.firstAddress) + " to " +
+                    std::to_string(track.firstAddress + track.count - 1) + " run past slot 512");
+    }
+  } else {
+    std::string p = path + ".tav";
+    w.ObjectAt(*tav, p);
+    track.family = kFamilyTAV;
+    track.network = static_cast<int32_t>(w.IntegerMember(*tav, p, "network", 1, kMaxInt));
+    track.unit = static_cast<int32_t>(w.IntegerMember(*tav, p, "unit", 0, 255));
+    track.firstAddress =
+        static_cast<int32_t>(w.IntegerMember(*tav, p, "first_circuit", 1, kMaxInt));
+    track.count = static_cast<int32_t>(w.IntegerMember(*tav, p, "count", 1, 4096));
+  }
+  track.startMs = w.IntegerOr(t, path, "start_ms", 0, kMaxTime, 0);
+  track.stepMs = static_cast<int32_t>(w.IntegerMember(t, path, "step_ms", 1, 60000));
+  const json& levels = w.ArrayAt(w.Member(t, path, "levels"), path + ".levels");
+  track.levels.reserve(levels.size() * static_cast<size_t>(track.count));
+  for (size_t k = 0; k < levels.size(); ++k) {
+    std::string p = path + ".levels[" + std::to_string(k) + "]";
+    const json& frame = levels[k];
+    if (frame.is_string()) {
+      const std::string& hex = frame.get_ref<const std::string&>();
+      if (hex.size() != static_cast<size_t>(track.count) * 2) {
+        w.Fail(p, "holds " + std::to_string(hex.size()) + " hexadecimal digits, " +
+                      std::to_string(track.count * 2) + " expected (two per level)");
+      }
+      for (size_t i = 0; i < hex.size(); i += 2) {
+        track.levels.push_back(
+            static_cast<uint8_t>(HexDigit(w, hex[i], p) << 4 | HexDigit(w, hex[i + 1], p)));
+      }
+    } else if (frame.is_array()) {
+      if (frame.size() != static_cast<size_t>(track.count)) {
+        w.Fail(p, "holds " + std::to_string(frame.size()) + " levels, " +
+                      std::to_string(track.count) + " expected");
+      }
+      for (size_t i = 0; i < frame.size(); ++i) {
+        track.levels.push_back(
+            static_cast<uint8_t>(w.Integer(frame[i], p + "[" + std::to_string(i) + "]", 0, 255)));
+      }
+    } else {
+      w.Fail(p,
+             "expected a hexadecimal text or a list of levels, found " + Walker::Describe(frame));
+    }
+  }
+  return track;
+}
+
+std::string PositionOf(std::string_view text, size_t byte) {
+  size_t line = 1, column = 1;
+  for (size_t i = 0; i < byte && i < text.size(); ++i) {
+    if (text[i] == '\n') {
+      ++line;
+      column = 1;
+    } else {
+      ++column;
+    }
+  }
+  return "line " + std::to_string(line) + ", column " + std::to_string(column);
+}
+
+}  // namespace
+
+bool LooksLikePlainSequence(std::string_view text) {
+  size_t i = 0;
+  if (text.substr(0, 3) == "\xEF\xBB\xBF") i = 3;
+  while (i < text.size() && std::isspace(static_cast<unsigned char>(text[i]))) ++i;
+  return i < text.size() && text[i] == '{';
+}
+
+SequenceData ParsePlainSequence(std::string_view text, const std::string& name) {
+  Walker w(name);
+  if (text.substr(0, 3) == "\xEF\xBB\xBF") text.remove_prefix(3);
+  json doc;
+  try {
+    doc = json::parse(text.begin(), text.end());
+  } catch (const json::parse_error& e) {
+    std::string what = e.what();
+    auto colon = what.rfind(": ");
+    w.Fail("", "not valid JSON at " + PositionOf(text, e.byte > 0 ? e.byte - 1 : 0) +
+                   (colon == std::string::npos ? "" : " (" + what.substr(colon + 2) + ")"));
+  }
+  w.ObjectAt(doc, "the document");
+  const json* version = w.Optional(doc, "tessavar_sequence");
+  if (!version) w.Fail("", "not a plain sequence (no \"tessavar_sequence\" version)");
+  int64_t v = w.Integer(*version, "tessavar_sequence", 1, 1000000);
+  if (v > kPlainSequenceVersion) {
+    w.Fail("tessavar_sequence", "version " + std::to_string(v) +
+                                    " is newer than this program reads (" +
+                                    std::to_string(kPlainSequenceVersion) + ")");
+  }
+
+  SequenceData data;
+  data.lengthMs = w.IntegerOr(doc, "", "length_ms", 0, kMaxTime, 0);
+  data.media = w.TextOr(doc, "", "media");
+  data.shellCommand = w.TextOr(doc, "", "shell_command");
+  if (const json* channels = w.Optional(doc, "channels")) {
+    w.ArrayAt(*channels, "channels");
+    data.channels.reserve(channels->size());
+    for (size_t i = 0; i < channels->size(); ++i) {
+      std::string path = "channels[" + std::to_string(i) + "]";
+      const json& c = w.ObjectAt((*channels)[i], path);
+      SequenceChannel channel;
+      channel.name = w.TextOr(c, path, "name");
+      channel.address = ReadAddress(w, c, path);
+      if (const json* effects = w.Optional(c, "effects")) {
+        w.ArrayAt(*effects, path + ".effects");
+        channel.effects.reserve(effects->size());
+        for (size_t k = 0; k < effects->size(); ++k) {
+          channel.effects.push_back(
+              ReadEffect(w, (*effects)[k], path + ".effects[" + std::to_string(k) + "]"));
+        }
+      }
+      data.channels.push_back(std::move(channel));
+    }
+  }
+  if (const json* frames = w.Optional(doc, "frames")) {
+    w.ArrayAt(*frames, "frames");
+    for (size_t i = 0; i < frames->size(); ++i) {
+      data.tracks.push_back(ReadTrack(w, (*frames)[i], "frames[" + std::to_string(i) + "]"));
+    }
+  }
+  if (const json* subs = w.Optional(doc, "subsequences")) {
+    w.ArrayAt(*subs, "subsequences");
+    for (size_t i = 0; i < subs->size(); ++i) {
+      std::string path = "subsequences[" + std::to_string(i) + "]";
+      const json& s = w.ObjectAt((*subs)[i], path);
+      SubsequenceRef ref;
+      ref.file = w.Text(w.Member(s, path, "file"), path + ".file");
+      if (ref.file.empty()) w.Fail(path + ".file", "empty file name");
+      ref.offsetMs = w.IntegerOr(s, path, "offset_ms", 0, kMaxTime, 0);
+      data.subsequences.push_back(std::move(ref));
+    }
+  }
+  return data;
+}
+
+namespace {
+
+json AddressJson(const ChannelAddress& a) {
+  switch (a.family) {
+    case kFamilyTAV:
+      return {{"network", a.network}, {"unit", a.unit}, {"circuit", a.circuit}};
+    case kFamilyX10:
+      return {{"house", std::string(1, static_cast<char>('A' + a.network - 1))},
+              {"unit", a.circuit}};
+    case kFamilyFennick:
+      return {{"network", a.network}, {"channel", a.circuit}};
+    default:
+      return {{"universe", a.network}, {"slot", a.circuit}};
+  }
+}
+
+const char* FamilyKey(int32_t family) {
+  switch (family) {
+    case kFamilyTAV:
+      return "tav";
+    case kFamilyX10:
+      return "x10";
+    case kFamilyFennick:
+      return "fennick";
+    default:
+      return "dmx";
+  }
+}
+
+std::string Hex(const uint8_t* p, size_t n) {
+  static const char* digits = "0123456789abcdef";
+  std::string s(n * 2, '0');
+  for (size_t i = 0; i < n; ++i) {
+    s[2 * i] = digits[p[i] >> 4];
+    s[2 * i + 1] = digits[p[i] & 15];
+  }
+  return s;
+}
+
+}  // namespace
+
+std::string WritePlainSequence(const SequenceData& data) {
+  json doc = json::object();
+  doc["tessavar_sequence"] = kPlainSequenceVersion;
+  if (data.lengthMs > 0) doc["length_ms"] = data.lengthMs;
+  if (!data.media.empty()) doc["media"] = data.media;
+  if (!data.shellCommand.empty()) doc["shell_command"] = data.shellCommand;
+  json channels = json::array();
+  for (const auto& channel : data.channels) {
+    json c = json::object();
+    if (!channel.name.empty()) c["name"] = channel.name;
+    c[FamilyKey(channel.address.family)] = AddressJson(channel.address);
+    json effects = json::array();
+    for (const auto& e : channel.effects) {
+      json j = {{"at", e.atMs}, {"type", EffectTypeName(e.type)}};
+      if (e.durationMs != 0) j["duration"] = e.durationMs;
+      if (e.type == kEffectSet) {
+        j["level"] = e.endIntensity;
+      } else if (e.type != kEffectOff) {
+        j["from"] = e.startIntensity;
+        j["to"] = e.endIntensity;
+      }
+      if (e.priority != 0) j["priority"] = e.priority;
+      effects.push_back(std::move(j));
+    }
+    c["effects"] = std::move(effects);
+    channels.push_back(std::move(c));
+  }
+  if (!channels.empty()) doc["channels"] = std::move(channels);
+  json frames = json::array();
+  for (const auto& track : data.tracks) {
+    json t = json::object();
+    if (track.family == kFamilyTAV) {
+      t["tav"] = {{"network", track.network},
+                  {"unit", track.unit},
+                  {"first_circuit", track.firstAddress},
+                  {"count", track.count}};
+    } else {
+      t["dmx"] = {
+          {"universe", track.network}, {"first_slot", track.firstAddress}, {"count", track.count}};
+    }
+    t["start_ms"] = track.startMs;
+    t["step_ms"] = track.stepMs;
+    json levels = json::array();
+    for (size_t k = 0; k < track.FrameCount(); ++k) {
+      levels.push_back(Hex(&track.levels[k * static_cast<size_t>(track.count)],
+                           static_cast<size_t>(track.count)));
+    }
+    t["levels"] = std::move(levels);
+    frames.push_back(std::move(t));
+  }
+  if (!frames.empty()) doc["frames"] = std::move(frames);
+  json subs = json::array();
+  for (const auto& s : data.subsequences)
+    subs.push_back({{"file", s.file}, {"offset_ms", s.offsetMs}});
+  if (!subs.empty()) doc["subsequences"] = std::move(subs);
+  return doc.dump(1) + "\n";
+}
+
+}  // namespace tav
