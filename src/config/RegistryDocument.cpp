@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cctype>
+#include <iterator>
 
 namespace tav {
 
@@ -75,13 +76,17 @@ bool RegistryDocument::KeyExists(std::string_view fullPath) const {
   return FindSection(fullPath) != nullptr || HasSubKeys(fullPath);
 }
 
-RegistryDocument::Section& RegistryDocument::EnsureSection(std::string_view fullPath) {
+RegistryDocument::Section& RegistryDocument::EnsureSection(std::string_view fullPath,
+                                                           bool inFileOrder) {
   if (Section* existing = FindSection(fullPath)) return *existing;
-  // Keep new keys in the editor's order: after their parent and any earlier
-  // siblings, so that a file stays readable however it was built.
-  auto at = std::find_if(m_sections.begin(), m_sections.end(),
-                         [&](const Section& s) { return PathLess(fullPath, s.path); });
-  return *m_sections.insert(at, Section{std::string(fullPath), {}});
+  Section section{std::string(fullPath), {}};
+  if (inFileOrder) return m_sections.emplace_back(std::move(section));
+  // After the last section that sorts before it: in a file in the editor's
+  // order that is its place in that order, and in any other file it still
+  // lands after its parent and earlier siblings rather than among strangers.
+  auto at = m_sections.end();
+  while (at != m_sections.begin() && !PathLess(std::prev(at)->path, fullPath)) --at;
+  return *m_sections.insert(at, std::move(section));
 }
 
 void RegistryDocument::RemoveKeyTree(std::string_view fullPath) {

@@ -42,7 +42,9 @@ class RegistryDocument {
   const std::vector<Section>& Sections() const { return m_sections; }
 
   // Full-path operations, as an import file applies them.
-  Section& EnsureSection(std::string_view fullPath);
+  // A new section goes at the end with `inFileOrder` (reading a file keeps
+  // its order), else after its parent and earlier siblings.
+  Section& EnsureSection(std::string_view fullPath, bool inFileOrder = false);
   void RemoveKeyTree(std::string_view fullPath);
   void SetValueAt(std::string_view fullPath, std::string_view name, const RegistryValue& value);
   void RemoveValueAt(std::string_view fullPath, std::string_view name);

@@ -186,8 +186,10 @@ std::string FormatHex(std::string prefix, std::string_view bytes) {
   size_t lineStart = 0;
   for (size_t i = 0; i < bytes.size(); ++i) {
     std::string token = fmt::format("{:02x}", static_cast<unsigned char>(bytes[i]));
-    if (i + 1 < bytes.size()) token += ',';
-    if (out.size() - lineStart + token.size() > 77) {
+    bool last = i + 1 == bytes.size();
+    if (!last) token += ',';
+    // At most 80 characters a line, counting the continuation backslash.
+    if (out.size() - lineStart + token.size() + (last ? 0 : 1) > 80) {
       out += "\\\n  ";
       lineStart = out.size() - 2;
     }
@@ -315,7 +317,7 @@ void ApplyRegistryFile(const RegistryFile& file, RegistryDocument& document, boo
   for (const auto& line : file.lines) {
     switch (line.kind) {
       case Kind::Key:
-        document.EnsureSection(line.key);
+        document.EnsureSection(line.key, /*inFileOrder=*/true);
         break;
       case Kind::DeleteKey:
         document.RemoveKeyTree(line.key);
