@@ -25,9 +25,10 @@ void TriggeredSequences::Copy(const std::shared_ptr<TriggeredSequences>& other) 
 }
 
 void TriggeredSequences::Copy(const TriggeredSequences& other) {
-  auto trig = std::make_shared<Trigger>();
-  m_trig = trig;
-  trig->Copy(other.m_trig);
+  // Hold the source trigger before replacing ours: other may be this object.
+  std::shared_ptr<Trigger> source = other.m_trig;
+  m_trig = std::make_shared<Trigger>();
+  m_trig->Copy(source);
   m_sequences = other.m_sequences;
 }
 

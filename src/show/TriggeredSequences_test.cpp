@@ -54,6 +54,8 @@ TEST(TriggeredSequences, CopySharesNothingAndKeepsItsOwnRoundRobinIndex) {
   source->Trig()->SetUnitId(99);
   source->SetSequence(0, "z");
   EXPECT_EQ(TriggeredSequencesToText(target), "(a,( 5,x, 2, 1),b,c)");
+  target.Copy(target);
+  EXPECT_EQ(TriggeredSequencesToText(target), "(a,( 5,x, 2, 1),b,c)");
 
   auto noTrigger = NewTriggeredSequences(nullptr, {"a"});
   EXPECT_EQ(ErrorNumber([&] { target.Copy(noTrigger); }), 91);
