@@ -291,12 +291,21 @@ bool LooksLikePlainSequence(std::string_view text) {
   return i < text.size() && text[i] == '{';
 }
 
-SequenceData ParsePlainSequence(std::string_view text, const std::string& name) {
+SequenceData ParsePlainSequence(std::string_view text, const std::string& name,
+                                const std::function<void()>& progress) {
   Walker w(name);
   if (text.substr(0, 3) == "\xEF\xBB\xBF") text.remove_prefix(3);
   json doc;
   try {
-    doc = json::parse(text.begin(), text.end());
+    if (progress) {
+      size_t events = 0;
+      doc = json::parse(text.begin(), text.end(), [&](int, json::parse_event_t, json&) {
+        if (++events % 16384 == 0) progress();
+        return true;
+      });
+    } else {
+      doc = json::parse(text.begin(), text.end());
+    }
   } catch (const json::parse_error& e) {
     std::string what = e.what();
     auto colon = what.rfind(": ");

@@ -1,0 +1,54 @@
+#pragma once
+// The sequence library on real files. Formats are told apart by content:
+// the plain JSON format, FSEQ (and ESEQ), and compressed exports. Plain
+// sequences include their subsequences (found beside the including file or
+// through the path resolver, kind 2) when they load; FSEQ files play from
+// disk block by block; absolute FSEQ channels land on DMX universes through
+// the universe map.
+//
+// Shares the clock, the file system and the resolver with whoever made it;
+// the sequences it makes keep what they need alive on their own.
+
+#include <functional>
+#include <memory>
+#include <string>
+
+#include "suite/seqlib/FileSystem.h"
+#include "suite/seqlib/PathResolver.h"
+#include "suite/seqlib/SequenceData.h"
+#include "suite/seqlib/SequenceLibrary.h"
+#include "suite/seqlib/UniverseMap.h"
+
+namespace tav {
+
+class FileSequenceLibrary : public SequenceLibrary {
+ public:
+  // Subsequences may include subsequences, this deep.
+  static constexpr int kMaxSubsequenceDepth = 16;
+
+  FileSequenceLibrary(std::shared_ptr<const Clock> clock, std::shared_ptr<FileSystem> fileSystem,
+                      std::shared_ptr<const PathResolver> resolver,
+                      UniverseMap universes = UniverseMap::Uniform());
+
+  // Network preferences may move universes; later loads use the new map.
+  void SetUniverseMap(const UniverseMap& universes);
+
+  std::shared_ptr<Sequence> CreateSequence() override;
+  std::shared_ptr<Sequence> LoadCompressed(const std::string& path) override;
+  void WriteCompressed(const Sequence& sequence, const std::string& path) override;
+
+  // What a load produces, without a sequence object around it.
+  std::shared_ptr<const SequenceContent> LoadContent(
+      const std::string& path, const std::function<void()>& keepAlive = {}) const;
+  // Any sequence file in the compiled form (an FSEQ file read whole).
+  std::shared_ptr<const CompiledSequence> LoadCompiled(
+      const std::string& path, const std::function<void()>& keepAlive = {}) const;
+
+  struct Core;
+
+ private:
+  std::shared_ptr<const Clock> m_clock;
+  std::shared_ptr<Core> m_core;
+};
+
+}  // namespace tav
