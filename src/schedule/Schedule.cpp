@@ -64,7 +64,13 @@ void Schedule::AddShowEvent(const std::shared_ptr<ShowEvent>& E) {
   if (!IsWait(CE)) throw Error(1, kAddSource, kConflict);
   m_modified = true;
 
-  if (!end.BetweenEquals(start, *CE.EndTime())) {
+  // A wait whose start equals its end fills the week, so no show can run past
+  // it. Its end must not be taken for a point in time: the week-end edit
+  // below would then empty the only wait and fail to delete it, and a show
+  // crossing Saturday midnight could never be added to an empty schedule (nor
+  // a saved schedule holding just such a show be read back).
+  const bool waitFillsWeek = CE.StartTime()->Equals(*CE.EndTime());
+  if (!waitFillsWeek && !end.BetweenEquals(start, *CE.EndTime())) {
     // The show runs past the end of its wait. That is allowed only across the
     // week end, where the last and the first wait are one wait split in two:
     // move their common boundary to the show's end, in place, so the last wait
