@@ -1,0 +1,89 @@
+#include "schedule/LocalTextFiles.h"
+
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cstdlib>
+#include <filesystem>
+#include <fstream>
+
+#include "support/Error.h"
+
+namespace tav {
+namespace {
+
+namespace fs = std::filesystem;
+
+class LocalTextFilesTest : public ::testing::Test {
+ protected:
+  LocalTextFilesTest() {
+    std::string pattern = (fs::temp_directory_path() / "tav-files-XXXXXX").string();
+    m_folder = ::mkdtemp(pattern.data());
+  }
+  ~LocalTextFilesTest() override {
+    fs::permissions(m_folder, fs::perms::owner_all);
+    fs::remove_all(m_folder);
+  }
+
+  std::string Path(const std::string& name) const { return (fs::path(m_folder) / name).string(); }
+  std::vector<std::string> Entries() const {
+    std::vector<std::string> names;
+    for (const auto& entry : fs::directory_iterator(m_folder)) {
+      names.push_back(entry.path().filename().string());
+    }
+    std::sort(names.begin(), names.end());
+    return names;
+  }
+  int32_t ErrorNumberOf(const std::function<void()>& action) {
+    try {
+      action();
+    } catch (const Error& e) {
+      return e.Number();
+    }
+    return 0;
+  }
+
+  LocalTextFiles files;
+  std::string m_folder;
+};
+
+TEST_F(LocalTextFilesTest, WritesAndReadsWholeTexts) {
+  std::string text = "((165600,2,(, 0,Xmas),151200))\r\n";
+  text += std::string(200000, 'x');  // more than one read buffer
+  files.WriteText(Path("weeksched.tsc"), text);
+  EXPECT_EQ(files.ReadText(Path("weeksched.tsc")), text);
+  files.WriteText(Path("weeksched.tsc"), "\r\n");
+  EXPECT_EQ(files.ReadText(Path("weeksched.tsc")), "\r\n");
+  EXPECT_EQ(Entries(), std::vector<std::string>{"weeksched.tsc"});  // no temporary left behind
+}
+
+TEST_F(LocalTextFilesTest, AMissingFileReadsAsNothing) {
+  EXPECT_EQ(files.ReadText(Path("missing.tsc")), std::nullopt);
+  EXPECT_NE(ErrorNumberOf([&] { files.ReadText(m_folder); }), 0);  // a folder is no file
+}
+
+TEST_F(LocalTextFilesTest, AnOverwrittenFileKeepsItsPermissions) {
+  files.WriteText(Path("yearsched.tsc"), "old");
+  ::chmod(Path("yearsched.tsc").c_str(), 0640);
+  files.WriteText(Path("yearsched.tsc"), "new");
+  struct stat info {};
+  ASSERT_EQ(::stat(Path("yearsched.tsc").c_str(), &info), 0);
+  EXPECT_EQ(info.st_mode & 0777, 0640u);
+}
+
+TEST_F(LocalTextFilesTest, AFailedWriteLeavesThePreviousFileAndNoTemporary) {
+  files.WriteText(Path("weeksched.tsc"), "previous\r\n");
+  EXPECT_EQ(ErrorNumberOf([&] { files.WriteText(Path("no/such/folder.tsc"), "x"); }), 76);
+  EXPECT_NE(ErrorNumberOf([&] { files.WriteText(m_folder, "x"); }), 0);  // onto a folder
+  if (::geteuid() != 0) {  // permissions do not hold back root
+    fs::permissions(m_folder, fs::perms::owner_read | fs::perms::owner_exec);
+    EXPECT_EQ(ErrorNumberOf([&] { files.WriteText(Path("weeksched.tsc"), "new\r\n"); }), 70);
+    fs::permissions(m_folder, fs::perms::owner_all);
+  }
+  EXPECT_EQ(files.ReadText(Path("weeksched.tsc")), "previous\r\n");
+  EXPECT_EQ(Entries(), std::vector<std::string>{"weeksched.tsc"});
+}
+
+}  // namespace
+}  // namespace tav
