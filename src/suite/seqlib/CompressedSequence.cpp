@@ -16,7 +16,8 @@ constexpr const char* kSource = "CompressedSequence.Read";
 constexpr char kMagic[4] = {'T', 'C', 'S', 0x1A};
 constexpr uint16_t kVersion = 1;
 constexpr uint64_t kMaxPayload = 1ull << 31;
-constexpr size_t kEffectBytes = 27;
+// at, channel, duration, type, start, end, priority: 8 + 4 + 4 + 1 + 1 + 1 + 4.
+constexpr size_t kEffectBytes = 23;
 
 class Out {
  public:
