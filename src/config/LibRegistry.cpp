@@ -141,6 +141,12 @@ std::vector<std::string> RegistryEnumSubKeys(RegistryStore& store, const std::st
   return names;
 }
 
+std::vector<NamedRegistryValue> RegistryEnumValues(RegistryStore& store, const std::string& key) {
+  std::vector<NamedRegistryValue> values;
+  Check(store.EnumValues(key, values), "RegistryEnumValues", kGetValueFailure);
+  return values;
+}
+
 RegistryKeyInfo RegistryQueryKeyInfo(RegistryStore& store, const std::string& key) {
   RegistryKeyInfo info;
   Check(store.QueryKeyInfo(key, info), "RegistryQueryKeyInfo", kGetValueFailure);

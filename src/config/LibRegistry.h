@@ -49,6 +49,7 @@ void RegistryDeleteValue(RegistryStore& store, const std::string& key,
 void RegistryDeleteKey(RegistryStore& store, const std::string& key);
 // "Error getting registry value" when the listing fails.
 std::vector<std::string> RegistryEnumSubKeys(RegistryStore& store, const std::string& key);
+std::vector<NamedRegistryValue> RegistryEnumValues(RegistryStore& store, const std::string& key);
 RegistryKeyInfo RegistryQueryKeyInfo(RegistryStore& store, const std::string& key);
 
 // The value if both key and value exist. A value that is neither text nor a

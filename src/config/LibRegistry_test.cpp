@@ -143,6 +143,8 @@ TEST_F(LibRegistryTest, EachFailingCallIsNamedInItsError) {
        "5|LibRegistry.RegistryDeleteKey|RegDeleteKey failure"},
       {RegistryOperation::EnumSubKeys, [&] { RegistryEnumSubKeys(store, kVideo); },
        "5|LibRegistry.RegistryEnumSubKeys|Error getting registry value"},
+      {RegistryOperation::EnumValues, [&] { RegistryEnumValues(store, kVideo); },
+       "5|LibRegistry.RegistryEnumValues|Error getting registry value"},
       {RegistryOperation::QueryKeyInfo, [&] { RegistryQueryKeyInfo(store, kVideo); },
        "5|LibRegistry.RegistryQueryKeyInfo|Error getting registry value"},
   };
