@@ -18,6 +18,7 @@ constexpr uint16_t kVersion = 1;
 constexpr uint64_t kMaxPayload = 1ull << 31;
 // at, channel, duration, type, start, end, priority: 8 + 4 + 4 + 1 + 1 + 1 + 4.
 constexpr size_t kEffectBytes = 23;
+constexpr int64_t kMaxTime = int64_t{1} << 40;
 
 class Out {
  public:
@@ -226,6 +227,10 @@ CompiledSequence ReadCompressedSequence(std::string_view bytes, const std::strin
 
   In p(payload.get(), payloadBytes, name);
   s.lengthMs = p.I64("the length");
+  if (s.lengthMs < 0 || s.lengthMs > kMaxTime) {
+    throw seqerrors::InvalidFormat(kSource,
+                                   name + ": impossible length " + std::to_string(s.lengthMs));
+  }
   s.media = p.Text("the media name");
   s.shellCommand = p.Text("the shell command");
   uint32_t subs = p.Count(12, "the subsequence list");
@@ -233,6 +238,9 @@ CompiledSequence ReadCompressedSequence(std::string_view bytes, const std::strin
     SubsequenceRef ref;
     ref.file = p.Text("a subsequence");
     ref.offsetMs = p.I64("a subsequence");
+    if (ref.offsetMs < 0 || ref.offsetMs > kMaxTime) {
+      throw seqerrors::InvalidFormat(kSource, name + ": impossible subsequence offset");
+    }
     s.subsequences.push_back(std::move(ref));
   }
   uint32_t channels = p.Count(17, "the channel table");
@@ -257,11 +265,16 @@ CompiledSequence ReadCompressedSequence(std::string_view bytes, const std::strin
     e.startIntensity = static_cast<int32_t>(p.U8("an effect"));
     e.endIntensity = static_cast<int32_t>(p.U8("an effect"));
     e.priority = p.I32("an effect");
-    if (e.channel >= channels || e.atMs < previous) {
+    const char* problem = e.channel >= channels             ? " names a channel that does not exist"
+                          : e.atMs < previous               ? " is out of play order"
+                          : e.atMs < 0 || e.atMs > kMaxTime ? " has an impossible time"
+                          : e.durationMs < 0                ? " has a negative duration"
+                          : e.type < kEffectOff || e.type > kEffectShimmer
+                              ? " has an unknown effect type"
+                              : nullptr;
+    if (problem) {
       throw seqerrors::InvalidFormat(
-          kSource, name + ": effect " + std::to_string(&e - s.effects.data()) +
-                       (e.channel >= channels ? " names a channel that does not exist"
-                                              : " is out of play order"));
+          kSource, name + ": effect " + std::to_string(&e - s.effects.data()) + problem);
     }
     previous = e.atMs;
   }
@@ -276,9 +289,11 @@ CompiledSequence ReadCompressedSequence(std::string_view bytes, const std::strin
     t.startMs = p.I64("a track");
     t.stepMs = p.I32("a track");
     uint32_t frames = p.U32("a track");
-    if (t.count <= 0 || t.stepMs <= 0) {
-      throw seqerrors::InvalidFormat(
-          kSource, name + ": track " + std::to_string(i) + " has no slots or no step time");
+    if (t.count <= 0 || t.stepMs <= 0 || t.stepMs > 60000 || t.startMs < 0 ||
+        t.startMs > kMaxTime) {
+      throw seqerrors::InvalidFormat(kSource,
+                                     name + ": track " + std::to_string(i) +
+                                         " has no slots, or an impossible start or step time");
     }
     uint64_t size = static_cast<uint64_t>(frames) * static_cast<uint64_t>(t.count);
     p.Need(size, "a track's levels");

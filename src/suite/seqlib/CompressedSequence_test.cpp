@@ -39,6 +39,15 @@ TEST(CompressedSequence, RoundTripKeepsEverything) {
   EXPECT_EQ(back.effects[2].atMs, 500);
 }
 
+TEST(CompressedSequence, ManyEffectsAndNothingAfterThemReadBack) {
+  SequenceData data;
+  SequenceChannel channel{"c", {kFamilyFennick, 1, 0, 2}, {}};
+  for (int i = 0; i < 40; ++i) channel.effects.push_back({i * 5, 5, kEffectShimmer, 0, 100, -3});
+  data.channels.push_back(channel);
+  CompiledSequence compiled = Compile(data, [](const SubsequenceRef&) { return nullptr; });
+  EXPECT_EQ(ReadCompressedSequence(WriteCompressedSequence(compiled), "many.tcs"), compiled);
+}
+
 TEST(CompressedSequence, EveryTruncationAndEveryFlippedByteIsAnErrorOrHarmless) {
   std::string bytes = WriteCompressedSequence(Sample());
   for (size_t length = 0; length < bytes.size(); ++length) {
