@@ -225,7 +225,10 @@ RegistryFile ParseRegistryFile(std::string_view bytes) {
           fmt::format("line {}: no registry editor header: {}", lineNumber, line));
     }
 
-    RegistryFileLine entry{Kind::Unreadable, lineNumber, key, {}, {}, std::string(line)};
+    RegistryFileLine entry;
+    entry.lineNumber = lineNumber;
+    entry.key = key;
+    entry.text = std::string(line);
     auto unreadable = [&](std::string_view reason) {
       entry.kind = Kind::Unreadable;
       file.problems.push_back(fmt::format("line {}: {}: {}", lineNumber, reason, entry.text));

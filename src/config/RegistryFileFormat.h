@@ -32,10 +32,10 @@ inline constexpr std::string_view kRegistryHeader4 = "REGEDIT4";
 
 struct RegistryFileLine {
   enum class Kind { Key, DeleteKey, Value, DeleteValue, Comment, Unreadable };
-  Kind kind;
-  int lineNumber;    // first physical line, from 1
-  std::string key;   // full path, hive first; empty before the first key
-  std::string name;  // value name ("" for the default value "@")
+  Kind kind = Kind::Unreadable;
+  int lineNumber = 0;  // first physical line, from 1
+  std::string key;     // full path, hive first; empty before the first key
+  std::string name;    // value name ("" for the default value "@")
   RegistryValue value;
   std::string text;  // the line as written (continuations joined by "\n")
 };
