@@ -3,6 +3,8 @@
 #include <asio.hpp>
 #include <cstdio>
 #include <exception>
+#include <optional>
+#include <vector>
 
 #include "support/Error.h"
 
@@ -12,119 +14,172 @@ namespace {
 
 using SteadyClock = std::chrono::steady_clock;
 
-struct TimerState {
-  TimerState(asio::io_context& context, std::string name, uint32_t interval, bool enabled,
-             std::function<void()> onTick,
-             std::shared_ptr<AsioTimerService::FailureReporter> reporter)
-      : timer(context),
-        name(std::move(name)),
-        interval(interval),
-        enabled(enabled),
-        onTick(std::make_shared<std::function<void()>>(std::move(onTick))),
-        reporter(std::move(reporter)) {}
+struct TimerState;
 
-  asio::steady_timer timer;
-  std::string name;
-  uint32_t interval;
-  bool enabled;
-  std::shared_ptr<std::function<void()>> onTick;
+// One Asio timer for the whole service, set to the earliest deadline of all
+// its timers: however many timers fall due together, the loop wakes once and
+// re-arms once.
+struct ServiceCore : std::enable_shared_from_this<ServiceCore> {
+  ServiceCore(asio::io_context& context,
+              std::shared_ptr<AsioTimerService::FailureReporter> reporter)
+      : wake(context), reporter(std::move(reporter)) {}
+
+  void Rearm();
+  void RunDue();
+  void Report(const std::string& name, const std::string& what) const;
+
+  asio::steady_timer wake;
+  std::optional<SteadyClock::time_point> armedFor;
+  std::vector<TimerState*> timers;  // live timers, in creation order
+  uint64_t armSequence = 0;
+  bool running = false;  // inside RunDue: re-arm once at its end
   std::shared_ptr<AsioTimerService::FailureReporter> reporter;
-  SteadyClock::time_point deadline;
-  // Bumped whenever the schedule changes, so a wait that completes after a
-  // change (or that cancellation could not stop in time) is recognised as
-  // stale and ignored.
-  uint64_t generation = 0;
 };
 
-void Wait(const std::shared_ptr<TimerState>& state);
+struct TimerState {
+  std::string name;
+  uint32_t interval = 0;
+  bool enabled = false;
+  std::shared_ptr<std::function<void()>> onTick;
+  std::optional<SteadyClock::time_point> deadline;
+  uint64_t armOrder = 0;  // ties between equal deadlines go by arming order
+};
 
-void ReportFailure(TimerState& state, const std::string& what) {
-  if (state.reporter && *state.reporter) {
-    (*state.reporter)(state.name, what);
+void ServiceCore::Report(const std::string& name, const std::string& what) const {
+  if (reporter && *reporter) {
+    (*reporter)(name, what);
   } else {
-    std::fprintf(stderr, "timer %s: uncaught failure in tick: %s\n", state.name.c_str(),
-                 what.c_str());
+    std::fprintf(stderr, "timer %s: uncaught failure in tick: %s\n", name.c_str(), what.c_str());
   }
 }
 
-void OnDeadline(const std::weak_ptr<TimerState>& weak, uint64_t generation,
-                const asio::error_code& error) {
-  std::shared_ptr<TimerState> state = weak.lock();
-  if (!state || error || state->generation != generation) return;
+void ServiceCore::Rearm() {
+  if (running) return;
+  std::optional<SteadyClock::time_point> earliest;
+  for (const TimerState* timer : timers) {
+    if (timer->deadline && (!earliest || *timer->deadline < *earliest)) earliest = timer->deadline;
+  }
+  if (earliest == armedFor) return;
+  armedFor = earliest;
+  if (!earliest) {
+    wake.cancel();
+    return;
+  }
+  wake.expires_at(*earliest);  // cancels the wait for the previous deadline
+  std::weak_ptr<ServiceCore> weak = shared_from_this();
+  wake.async_wait([weak](const asio::error_code& error) {
+    if (error) return;  // superseded by a new deadline, or shut down
+    if (auto core = weak.lock()) core->RunDue();
+  });
+}
 
-  // Schedule the next tick before running this one: whatever the handler
-  // changes then simply supersedes it.
+void ServiceCore::RunDue() {
+  // Keep the core alive even if a handler destroys the service.
+  std::shared_ptr<ServiceCore> self = shared_from_this();
+  armedFor.reset();
+  running = true;
   const auto now = SteadyClock::now();
-  const auto interval = std::chrono::milliseconds(state->interval);
-  state->deadline += interval;
-  if (state->deadline <= now) state->deadline = now + interval;
-  Wait(state);
-
-  std::shared_ptr<std::function<void()>> onTick = state->onTick;
-  if (!*onTick) return;
-  try {
-    (*onTick)();
-  } catch (const Error& e) {
-    ReportFailure(*state, e.Description());
-  } catch (const std::exception& e) {
-    ReportFailure(*state, e.what());
-  } catch (...) {
-    ReportFailure(*state, "unknown failure");
+  while (true) {
+    // Picked afresh each time: a handler may create, change or destroy timers.
+    TimerState* next = nullptr;
+    for (TimerState* timer : timers) {
+      if (!timer->deadline || *timer->deadline > now) continue;
+      if (!next || *timer->deadline < *next->deadline ||
+          (*timer->deadline == *next->deadline && timer->armOrder < next->armOrder)) {
+        next = timer;
+      }
+    }
+    if (!next) break;
+    // The next deadline follows by the interval; one that would already be
+    // past (the loop was busy) counts from now instead, so missed ticks are
+    // not queued up.
+    const auto interval = std::chrono::milliseconds(next->interval);
+    *next->deadline += interval;
+    if (*next->deadline <= now) next->deadline = now + interval;
+    next->armOrder = ++armSequence;
+    std::string name = next->name;
+    std::shared_ptr<std::function<void()>> onTick = next->onTick;
+    // `next` may be gone once the handler has run.
+    if (!*onTick) continue;
+    try {
+      (*onTick)();
+    } catch (const Error& e) {
+      Report(name, e.Description());
+    } catch (const std::exception& e) {
+      Report(name, e.what());
+    } catch (...) {
+      Report(name, "unknown failure");
+    }
   }
-}
-
-void Wait(const std::shared_ptr<TimerState>& state) {
-  state->timer.expires_at(state->deadline);
-  std::weak_ptr<TimerState> weak = state;
-  uint64_t generation = state->generation;
-  state->timer.async_wait(
-      [weak, generation](const asio::error_code& error) { OnDeadline(weak, generation, error); });
+  running = false;
+  Rearm();
 }
 
 class AsioTimer : public Timer {
  public:
-  explicit AsioTimer(std::shared_ptr<TimerState> state) : m_state(std::move(state)) { Restart(); }
-  ~AsioTimer() override { m_state->timer.cancel(); }
-
-  const std::string& Name() const override { return m_state->name; }
-  uint32_t Interval() const override { return m_state->interval; }
-  void SetInterval(uint32_t milliseconds) override {
-    m_state->interval = milliseconds;
+  AsioTimer(std::shared_ptr<ServiceCore> core, std::string name, uint32_t interval, bool enabled,
+            std::function<void()> onTick)
+      : m_core(std::move(core)) {
+    m_state.name = std::move(name);
+    m_state.interval = interval;
+    m_state.enabled = enabled;
+    m_state.onTick = std::make_shared<std::function<void()>>(std::move(onTick));
+    m_core->timers.push_back(&m_state);
     Restart();
   }
-  bool Enabled() const override { return m_state->enabled; }
+  ~AsioTimer() override {
+    std::erase(m_core->timers, &m_state);
+    m_core->Rearm();
+  }
+
+  const std::string& Name() const override { return m_state.name; }
+  uint32_t Interval() const override { return m_state.interval; }
+  void SetInterval(uint32_t milliseconds) override {
+    m_state.interval = milliseconds;
+    Restart();
+  }
+  bool Enabled() const override { return m_state.enabled; }
   void SetEnabled(bool enabled) override {
-    if (enabled == m_state->enabled) return;
-    m_state->enabled = enabled;
+    if (enabled == m_state.enabled) return;
+    m_state.enabled = enabled;
     Restart();
   }
   void SetOnTick(std::function<void()> onTick) override {
-    m_state->onTick = std::make_shared<std::function<void()>>(std::move(onTick));
+    m_state.onTick = std::make_shared<std::function<void()>>(std::move(onTick));
   }
 
  private:
   void Restart() {
-    ++m_state->generation;
-    m_state->timer.cancel();
-    if (!m_state->enabled || m_state->interval == 0) return;
-    m_state->deadline = SteadyClock::now() + std::chrono::milliseconds(m_state->interval);
-    Wait(m_state);
+    if (m_state.enabled && m_state.interval > 0) {
+      m_state.deadline = SteadyClock::now() + std::chrono::milliseconds(m_state.interval);
+      m_state.armOrder = ++m_core->armSequence;
+    } else {
+      m_state.deadline.reset();
+    }
+    m_core->Rearm();
   }
 
-  std::shared_ptr<TimerState> m_state;
+  std::shared_ptr<ServiceCore> m_core;
+  TimerState m_state;
 };
 
 }  // namespace
 
+struct AsioTimerService::Core : ServiceCore {
+  using ServiceCore::ServiceCore;
+};
+
 AsioTimerService::AsioTimerService(EventLoop& loop)
-    : m_loop(loop), m_reporter(std::make_shared<FailureReporter>()) {}
+    : m_reporter(std::make_shared<FailureReporter>()),
+      m_core(std::make_shared<Core>(loop.Context(), m_reporter)) {}
+
+AsioTimerService::~AsioTimerService() = default;
 
 std::unique_ptr<Timer> AsioTimerService::CreateTimer(std::string name,
                                                      uint32_t intervalMilliseconds, bool enabled,
                                                      std::function<void()> onTick) {
-  auto state = std::make_shared<TimerState>(m_loop.Context(), std::move(name), intervalMilliseconds,
-                                            enabled, std::move(onTick), m_reporter);
-  return std::make_unique<AsioTimer>(std::move(state));
+  return std::make_unique<AsioTimer>(m_core, std::move(name), intervalMilliseconds, enabled,
+                                     std::move(onTick));
 }
 
 void AsioTimerService::SetFailureReporter(FailureReporter reporter) {

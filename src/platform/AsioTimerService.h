@@ -1,10 +1,13 @@
 #pragma once
-// The TimerService on the event loop: each enabled timer waits on an Asio
-// steady timer for its next deadline, so the loop sleeps until the nearest
-// deadline and never polls. Deadlines follow each other by the interval; a
-// tick delivered late (the loop was busy) is delivered once, and the next
-// deadline then counts from that moment instead of queueing the missed ones.
-// Setting the interval, or enabling a disabled timer, starts a fresh interval.
+// The TimerService on the event loop. The service keeps its timers'
+// deadlines and sets one Asio steady timer to the earliest, so the loop
+// sleeps until the next deadline and never polls, and timers falling due
+// together cost one wakeup. Due ticks fire in deadline order, ties in the
+// order their timers were armed (as on virtual time). Deadlines follow each
+// other by the interval; a tick delivered late (the loop was busy) is
+// delivered once, and the next deadline then counts from that moment instead
+// of queueing the missed ones. Setting the interval, or enabling a disabled
+// timer, starts a fresh interval.
 //
 // Tick handlers are expected to catch their own failures. One that escapes
 // is handed to the failure reporter (standard error by default) so that the
@@ -28,6 +31,7 @@ class AsioTimerService : public TimerService {
       std::function<void(const std::string& timerName, const std::string& what)>;
 
   explicit AsioTimerService(EventLoop& loop);
+  ~AsioTimerService() override;
 
   std::unique_ptr<Timer> CreateTimer(std::string name, uint32_t intervalMilliseconds, bool enabled,
                                      std::function<void()> onTick) override;
@@ -35,8 +39,9 @@ class AsioTimerService : public TimerService {
   void SetFailureReporter(FailureReporter reporter);
 
  private:
-  EventLoop& m_loop;
+  struct Core;
   std::shared_ptr<FailureReporter> m_reporter;
+  std::shared_ptr<Core> m_core;
 };
 
 }  // namespace tav

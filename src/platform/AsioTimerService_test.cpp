@@ -70,6 +70,30 @@ TEST(AsioTimerService, HandlerMayDestroyItselfAndOthersAndChangeIntervals) {
   EXPECT_EQ(slowTicks, 1);
 }
 
+TEST(AsioTimerService, TimersEnabledOrMadeInsideATickAreScheduled) {
+  EventLoop loop;
+  AsioTimerService timers(loop);
+  std::vector<std::string> order;
+  std::unique_ptr<Timer> later = timers.CreateTimer("later", 2, false, [&] {
+    order.push_back("later");
+    loop.Stop();
+  });
+  std::unique_ptr<Timer> made;
+  std::unique_ptr<Timer> once;
+  once = timers.CreateTimer("once", 1, true, [&] {
+    order.push_back("once");
+    once->SetEnabled(false);
+    // Both count from this tick; the one-shot made here is due first.
+    later->SetEnabled(true);
+    made = timers.CreateTimer("made", 1, true, [&] {
+      order.push_back("made");
+      made->SetEnabled(false);
+    });
+  });
+  loop.Run();
+  EXPECT_EQ(order, (std::vector<std::string>{"once", "made", "later"}));
+}
+
 TEST(AsioTimerService, EscapingFailureIsReportedAndTheTimerGoesOn) {
   EventLoop loop;
   AsioTimerService timers(loop);
