@@ -4,7 +4,10 @@
 //
 // Reads answer from the file's content as last loaded, reloading first when
 // the file has changed (device, inode, size or modification time differ), so
-// a change made by another program counts at the next read. Every change is
+// a change made by another program counts at the next read. (A rewrite in
+// place that keeps the size, within the file system's timestamp granularity
+// of the last load, can go unseen until the next change; the suite's writers
+// replace the file, which changes its inode.) Every change is
 // one transaction: take an exclusive lock on "<file>.lock", reload, apply,
 // write a temporary file beside it, sync it, rename it over the file and sync
 // the folder. Writers therefore never lose each other's values, and a crash
