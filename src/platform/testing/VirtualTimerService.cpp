@@ -28,7 +28,8 @@ class VirtualTimer : public Timer {
         m_name(std::move(name)),
         m_interval(interval),
         m_enabled(enabled),
-        m_onTick(std::make_shared<std::function<void()>>(std::move(onTick))) {
+        m_onTick(std::make_shared<std::function<void()>>(std::move(onTick))),
+        m_ticksFired(&m_core->ticksFired[m_name]) {
     m_core->timers.push_back(this);
     Arm();
   }
@@ -64,7 +65,7 @@ class VirtualTimer : public Timer {
   void Fire() {
     m_due = *m_due + m_interval;
     m_armOrder = ++m_core->armSequence;
-    ++m_core->ticksFired[m_name];
+    ++*m_ticksFired;
     // Keep the handler alive even if it destroys its own timer.
     std::shared_ptr<std::function<void()>> onTick = m_onTick;
     if (*onTick) (*onTick)();
@@ -87,6 +88,7 @@ class VirtualTimer : public Timer {
   std::shared_ptr<std::function<void()>> m_onTick;
   std::optional<uint64_t> m_due;
   uint64_t m_armOrder = 0;
+  uint64_t* m_ticksFired;  // a map node: stays valid while the core lives
 };
 
 VirtualTimer* NextDue(const VirtualTimerService::Core& core) {
