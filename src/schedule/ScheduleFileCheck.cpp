@@ -119,7 +119,7 @@ std::shared_ptr<Schedule> CheckShows(FileCheck& check, std::string_view text,
     }
   }
   if (stopped) {
-    Add(check, true,
+    Add(check, false,
         prefix +
             "the player stops reading the file at the first of these problems and keeps "
             "none of it");
