@@ -369,7 +369,9 @@ SequenceData ParsePlainSequence(std::string_view text, const std::string& name,
 
 namespace {
 
-json AddressJson(const ChannelAddress& a) {
+using nlohmann::ordered_json;
+
+ordered_json AddressJson(const ChannelAddress& a) {
   switch (a.family) {
     case kFamilyTAV:
       return {{"network", a.network}, {"unit", a.unit}, {"circuit", a.circuit}};
@@ -409,19 +411,19 @@ std::string Hex(const uint8_t* p, size_t n) {
 }  // namespace
 
 std::string WritePlainSequence(const SequenceData& data) {
-  json doc = json::object();
+  ordered_json doc = ordered_json::object();
   doc["tessavar_sequence"] = kPlainSequenceVersion;
   if (data.lengthMs > 0) doc["length_ms"] = data.lengthMs;
   if (!data.media.empty()) doc["media"] = data.media;
   if (!data.shellCommand.empty()) doc["shell_command"] = data.shellCommand;
-  json channels = json::array();
+  ordered_json channels = ordered_json::array();
   for (const auto& channel : data.channels) {
-    json c = json::object();
+    ordered_json c = ordered_json::object();
     if (!channel.name.empty()) c["name"] = channel.name;
     c[FamilyKey(channel.address.family)] = AddressJson(channel.address);
-    json effects = json::array();
+    ordered_json effects = ordered_json::array();
     for (const auto& e : channel.effects) {
-      json j = {{"at", e.atMs}, {"type", EffectTypeName(e.type)}};
+      ordered_json j = {{"at", e.atMs}, {"type", EffectTypeName(e.type)}};
       if (e.durationMs != 0) j["duration"] = e.durationMs;
       if (e.type == kEffectSet) {
         j["level"] = e.endIntensity;
@@ -436,9 +438,9 @@ std::string WritePlainSequence(const SequenceData& data) {
     channels.push_back(std::move(c));
   }
   if (!channels.empty()) doc["channels"] = std::move(channels);
-  json frames = json::array();
+  ordered_json frames = ordered_json::array();
   for (const auto& track : data.tracks) {
-    json t = json::object();
+    ordered_json t = ordered_json::object();
     if (track.family == kFamilyTAV) {
       t["tav"] = {{"network", track.network},
                   {"unit", track.unit},
@@ -450,7 +452,7 @@ std::string WritePlainSequence(const SequenceData& data) {
     }
     t["start_ms"] = track.startMs;
     t["step_ms"] = track.stepMs;
-    json levels = json::array();
+    ordered_json levels = ordered_json::array();
     for (size_t k = 0; k < track.FrameCount(); ++k) {
       levels.push_back(Hex(&track.levels[k * static_cast<size_t>(track.count)],
                            static_cast<size_t>(track.count)));
@@ -459,7 +461,7 @@ std::string WritePlainSequence(const SequenceData& data) {
     frames.push_back(std::move(t));
   }
   if (!frames.empty()) doc["frames"] = std::move(frames);
-  json subs = json::array();
+  ordered_json subs = ordered_json::array();
   for (const auto& s : data.subsequences)
     subs.push_back({{"file", s.file}, {"offset_ms", s.offsetMs}});
   if (!subs.empty()) doc["subsequences"] = std::move(subs);
