@@ -29,19 +29,6 @@ TEST(Msg, FrameCarriesSenderTagThreeAndTheTextWithItsZeroByte) {
   EXPECT_EQ(CopyDataFrame(7, "").data, "\0"s);
 }
 
-TEST(Msg, TypedSendGoesFromTheLinksOwnWindowToTheTarget) {
-  TrayLinkPair link(41);
-  auto& tray = link.Connect();
-  auto& other = link.Connect();
-  SendTypedMessage(link, tray.Handle(), 4, "(x)");
-  ASSERT_EQ(tray.Received().size(), 1u);
-  EXPECT_EQ(tray.Received()[0], (TrayFrame{41, 3, "04(x)\0"s}));
-  EXPECT_TRUE(other.Received().empty());
-  // A window that does not exist: lost, no failure.
-  SendTypedMessage(link, 0, 7, "line");
-  SendRawMessage(link, 999, "07line");
-}
-
 struct Decoded {
   int32_t type;
   std::string text;

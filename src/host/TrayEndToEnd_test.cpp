@@ -16,6 +16,7 @@
 #include "host/TrayMessaging.h"
 #include "platform/AsioTimerService.h"
 #include "platform/EventLoop.h"
+#include "platform/TrayLinkFrame.h"
 #include "platform/UnixTrayLink.h"
 #include "platform/UnixTrayLinkClient.h"
 #include "platform/testing/ManualClock.h"
@@ -288,7 +289,8 @@ TEST_F(TrayEndToEnd, GarbageAndOversizedTraysAreDroppedWithoutHarmingTheOthers) 
   UnixTrayLinkClient garbage(path);
   UnixTrayLinkClient oversized(path);
   garbage.SendBytes(std::string(64, '\x07'));
-  oversized.Send(TrayFrame{0, 3, std::string(5000, 'x')});
+  // Only the header of a frame too big: refused without waiting for the data.
+  oversized.SendBytes(EncodeTrayFrame(TrayFrame{0, 3, std::string(5000, 'x')}).substr(0, 20));
   ASSERT_TRUE(RunUntil([&] { return disconnects.size() == 2; }, monitor.get()));
   std::sort(disconnects.begin(), disconnects.end());
   EXPECT_EQ(disconnects, (std::vector<std::string>{"bad frame header", "oversized frame"}));

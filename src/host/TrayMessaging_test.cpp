@@ -239,13 +239,6 @@ TEST_F(TrayMessagingTest, ATextWithoutAZeroByteIsLoggedAndDropped) {
   EXPECT_FALSE(messaging.tmrTAVMsgQueue().Enabled());
 }
 
-TEST_F(TrayMessagingTest, TheSenderHandleIsTheWindowTheFrameCameFrom) {
-  auto& tray = link.Connect();
-  tray.Send(TrayFrame{12345, 3, "02\0"s});  // claims another window; the link stamps its own
-  timers.Advance(1);
-  EXPECT_EQ(messaging.TrayWindow(), tray.Handle());
-}
-
 TEST_F(TrayMessagingTest, StatusIsSentOnlyWhenCurrentOrNextChanged) {
   auto& tray = link.Connect();
   messaging.SendStatusToTAVTray(false);  // no tray yet

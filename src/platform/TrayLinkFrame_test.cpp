@@ -93,16 +93,5 @@ TEST(TrayLinkFrame, AnOversizedFrameIsRefusedFromItsHeaderAlone) {
             1u);
 }
 
-TEST(TrayLinkFrame, HeaderParserNeedsTwentyBytes) {
-  TrayFrameHeader header;
-  std::string bytes = EncodeTrayFrame(TrayFrame{5, 6, "abc"});
-  EXPECT_EQ(ParseTrayFrameHeader(bytes.substr(0, 19), 10, header), TrayFrameStatus::kIncomplete);
-  ASSERT_EQ(ParseTrayFrameHeader(bytes, 10, header), TrayFrameStatus::kFrame);
-  EXPECT_EQ(header.senderHwnd, 5u);
-  EXPECT_EQ(header.dwData, 6u);
-  EXPECT_EQ(header.cbData, 3u);
-  EXPECT_EQ(ParseTrayFrameHeader(bytes, 2, header), TrayFrameStatus::kTooLarge);
-}
-
 }  // namespace
 }  // namespace tav

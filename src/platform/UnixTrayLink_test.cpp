@@ -102,36 +102,6 @@ TEST_F(UnixTrayLinkTest, EachConnectionIsItsOwnWindow) {
   for (const auto& f : frames) EXPECT_EQ(f.senderHwnd, f.data == "from a" ? handleA : handleB);
 }
 
-TEST_F(UnixTrayLinkTest, MisbehavingTraysAreDroppedAndTheOthersGoOn) {
-  UnixTrayLinkLimits limits;
-  limits.maxFrameBytes = 1000;
-  Open(limits);
-  auto [good, goodHandle] = Connect();
-  auto [garbage, garbageHandle] = Connect();
-  auto [oversized, oversizedHandle] = Connect();
-
-  garbage->SendBytes("GET /showplayer HTTP/1.1\r\nHost: localhost\r\n\r\n");
-  // Only the header of a frame too big: refused without waiting for the data.
-  oversized->SendBytes(EncodeTrayFrame(TrayFrame{0, 3, std::string(1001, 'x')}).substr(0, 20));
-  ASSERT_TRUE(RunUntil([&] { return dropped.size() == 2; }));
-  EXPECT_NE(std::find(dropped.begin(), dropped.end(),
-                      std::to_string(garbageHandle) + " bad frame header"),
-            dropped.end());
-  EXPECT_NE(std::find(dropped.begin(), dropped.end(),
-                      std::to_string(oversizedHandle) + " oversized frame"),
-            dropped.end());
-  EXPECT_THROW(garbage->Receive(1000), Error);
-  EXPECT_TRUE(garbage->Closed());
-  EXPECT_THROW(oversized->Receive(1000), Error);
-
-  good->Send(TrayFrame{0, 3, std::string(1000, 'y')});  // the limit itself is fine
-  ASSERT_TRUE(RunUntil([&] { return frames.size() == 1; }));
-  EXPECT_EQ(frames[0].senderHwnd, goodHandle);
-  EXPECT_TRUE(link->Send(goodHandle, TrayFrame{1, 3, "still here"}));
-  EXPECT_EQ(good->Receive(1000)->data, "still here");
-  EXPECT_EQ(link->ConnectionCount(), 1u);
-}
-
 TEST_F(UnixTrayLinkTest, ATrayThatDoesNotReadIsDroppedOnceTooMuchWaits) {
   UnixTrayLinkLimits limits;
   limits.maxQueuedBytes = 64 * 1024;
