@@ -35,12 +35,16 @@ std::shared_ptr<MonitoredShowEvent> MakeEvent(const std::string& filename,
 std::optional<Occurrence> DatedShowAt(const YearSchedule& year, DateTime t) {
   std::optional<Occurrence> best;
   const DateTime today = t.DateOnly();
+  const auto weekTime = WeekTimeFromDate(t);
   for (DateTime date : {today.AddDays(-1), today}) {
     auto schedule = year.DateSchedule(date);
     if (!schedule) continue;
     for (auto node = schedule->FirstNode(); node; node = node->NextNode()) {
       const auto& event = node->Obj();
       if (event->EventType() != kEventTypeShow) continue;
+      // An occurrence can hold t only if the show's span of the week holds
+      // t's week time; this cheap test spares the calendar arithmetic.
+      if (!weekTime->InRange(*event->StartTime(), *event->EndTime())) continue;
       auto range = event->Range(date);
       if (!range->HasStart() || !range->Includes(t, true, false)) continue;
       if (best && range->StartTime() > best->Range->StartTime()) continue;

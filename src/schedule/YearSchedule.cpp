@@ -27,9 +27,22 @@ int64_t FloorDiv(int64_t a, int64_t b) {
 }  // namespace
 
 std::string YearSchedule::DateToString(DateTime date) {
-  char buffer[32];
-  std::snprintf(buffer, sizeof buffer, "%04d-%02d-%02d", date.Year(), date.Month(), date.Day());
-  return buffer;
+  // Written by hand rather than with snprintf: the host looks dates up every
+  // second, and this is most of the cost of a lookup.
+  int year = date.Year(), month = date.Month(), day = date.Day();
+  if (year < 0 || year > 9999) {
+    char buffer[32];
+    std::snprintf(buffer, sizeof buffer, "%04d-%02d-%02d", year, month, day);
+    return buffer;
+  }
+  std::string key = "0000-00-00";
+  for (int i = 3; i >= 0; --i, year /= 10)
+    key[static_cast<size_t>(i)] = static_cast<char>('0' + year % 10);
+  key[5] = static_cast<char>('0' + month / 10);
+  key[6] = static_cast<char>('0' + month % 10);
+  key[8] = static_cast<char>('0' + day / 10);
+  key[9] = static_cast<char>('0' + day % 10);
+  return key;
 }
 
 DateTime YearSchedule::DateStringToDate(std::string_view szDateString) {
@@ -75,8 +88,10 @@ void YearSchedule::AddSchedule(DateTime SchedDate, std::shared_ptr<Schedule> Sch
   m_modified = true;
   std::string key = DateToString(SchedDate);
   if (m_schedules.count(key) != 0) throw errors::KeyAlreadyAssociated("YearSchedule.AddSchedule");
+  DateTime keyDate = DateStringToDate(key);
   m_schedules.emplace(key, std::move(Sched));
   m_keys.push_back(std::move(key));
+  m_keyDates.push_back(keyDate);
 }
 
 std::shared_ptr<ShowEvent> YearSchedule::FirstShowWithinRange(
@@ -84,15 +99,16 @@ std::shared_ptr<ShowEvent> YearSchedule::FirstShowWithinRange(
   std::shared_ptr<TimeRange> range = trRange ? trRange : std::make_shared<TimeRange>();
   std::shared_ptr<ShowEvent> best;
   DateTime bestStart;
-  for (const std::string& key : m_keys) {
-    DateTime date = DateStringToDate(key);
+  for (size_t i = 0; i < m_keys.size(); ++i) {
+    const std::string& key = m_keys[i];
+    const DateTime date = m_keyDates[i];  // DateStringToDate(key), read once
     // No show of this date can start before a show already found.
     if (best && bestStart < date) continue;
     // Two days: a dated show may end on the next day.
-    auto daySpan = std::make_shared<TimeRange>();
-    daySpan->SetStartTime(date);
-    daySpan->SetEndTime(date.AddDays(2));
-    if (!daySpan->Overlaps(range, true, false, true, false)) continue;
+    TimeRange daySpan;
+    daySpan.SetStartTime(date);
+    daySpan.SetEndTime(date.AddDays(2));
+    if (!daySpan.Overlaps(range, true, false, true, false)) continue;
 
     for (auto node = m_schedules.at(key)->FirstNode(); node; node = node->NextNode()) {
       const auto& event = node->Obj();
@@ -142,7 +158,9 @@ void YearSchedule::AddShowEventByFile(std::string szFilename, DateTime start, Da
   if (!schedule) {
     schedule = std::make_shared<Schedule>();
     schedule->AddShowEventByFile(std::move(szFilename), wtStart, wtEnd);
+    DateTime keyDate = DateStringToDate(key);
     m_schedules.emplace(key, schedule);
+    m_keyDates.push_back(keyDate);
     m_keys.push_back(key);
   } else if (schedule->CheckAdd(*wtStart, *wtEnd) == 0) {
     schedule->AddShowEventByFile(std::move(szFilename), wtStart, wtEnd);
@@ -159,7 +177,9 @@ void YearSchedule::RemoveShowEvent(DateTime ShowDate, const std::shared_ptr<Node
   schedule->RemoveShowEvent(ShowNode);
   if (schedule->Count() == 1) {
     m_schedules.erase(key);
-    m_keys.erase(std::find(m_keys.begin(), m_keys.end(), key));
+    auto index = std::find(m_keys.begin(), m_keys.end(), key) - m_keys.begin();
+    m_keys.erase(m_keys.begin() + index);
+    m_keyDates.erase(m_keyDates.begin() + index);
   }
 }
 

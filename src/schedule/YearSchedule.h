@@ -59,6 +59,7 @@ class YearSchedule {
 
  private:
   std::vector<std::string> m_keys;
+  std::vector<DateTime> m_keyDates;  // the dates of m_keys, for the range search
   std::unordered_map<std::string, std::shared_ptr<Schedule>> m_schedules;
   bool m_modified = false;
 };
