@@ -161,7 +161,7 @@ void Monitor() {
     }
     try {
       PrintMessage(DecodeReceivedMessage(*frame));
-    } catch (const Error& e) {
+    } catch (const Error&) {
       Print("invalid", "a message without its terminating zero byte");
     }
   }
