@@ -348,8 +348,9 @@ void PrintFindings(const FileCheck& check) {
 }
 
 // Which kind of file to check: by the player's own file names, else by the
-// content (a week schedule's records start with a number, a year schedule's
-// with a date; anything else is taken for a show file).
+// content. A week schedule's records have a file reference list as their
+// third field, a year schedule's start with a date; a show file's first
+// field is a playlist, whose third field is a number.
 std::string KindOf(const std::string& path, const std::string& text) {
   std::string name = fs::path(path).filename().string();
   if (name == "weeksched.tsc") return "week";
@@ -360,12 +361,12 @@ std::string KindOf(const std::string& path, const std::string& text) {
     TextArray records = ListFromText(text, 1);
     if (ArrayCount(records) >= 1) {
       TextArray first = ListFromText(records[1], 1);
-      if (ArrayCount(first) >= 1 && first[1].find('(') == std::string::npos) return "week";
+      if (ArrayCount(first) >= 3 && first[3].find('(') != std::string::npos) return "week";
+      return "show";
     }
   } catch (const tav::Error&) {
-    return "week";
   }
-  return "show";
+  return fs::path(path).extension() == ".tsc" ? "week" : "show";
 }
 
 void CheckShowFile(const std::string& text, int& problems) {
