@@ -8,7 +8,9 @@
 #include "suite/seqlib/FseqEventStream.h"
 #include "suite/seqlib/FseqFile.h"
 
-TAV_FUZZ_TARGET({
+namespace {
+
+void FuzzOne(std::string_view input) {
   auto file = std::make_shared<tav::MemoryFile>(std::string(input), "fuzz.fseq");
   auto reader = std::make_unique<tav::FseqFile>(file);
   uint32_t frames = reader->FrameCount();
@@ -25,4 +27,8 @@ TAV_FUZZ_TARGET({
   stream.Seek(0);
   tav::PlayEvent event;
   for (int i = 0; i < 64 && stream.NextTime() != tav::EventStream::kEnd; ++i) stream.Next(event);
-})
+}
+
+}  // namespace
+
+TAV_FUZZ_TARGET(FuzzOne(input))

@@ -6,7 +6,9 @@
 #include "suite/seqlib/CompiledEventStream.h"
 #include "suite/seqlib/PlainSequence.h"
 
-TAV_FUZZ_TARGET({
+namespace {
+
+void FuzzOne(std::string_view input) {
   tav::SequenceData data = tav::ParsePlainSequence(input, "fuzz.tseq");
   if (tav::ParsePlainSequence(tav::WritePlainSequence(data), "again") != data) __builtin_trap();
   auto compiled = std::make_shared<tav::CompiledSequence>(
@@ -23,4 +25,8 @@ TAV_FUZZ_TARGET({
     }
   }
   (void)stream.LightsOff();
-})
+}
+
+}  // namespace
+
+TAV_FUZZ_TARGET(FuzzOne(input))

@@ -6,7 +6,9 @@
 #include "suite/seqlib/CompiledEventStream.h"
 #include "suite/seqlib/CompressedSequence.h"
 
-TAV_FUZZ_TARGET({
+namespace {
+
+void FuzzOne(std::string_view input) {
   auto compiled =
       std::make_shared<tav::CompiledSequence>(tav::ReadCompressedSequence(input, "fuzz.tcs"));
   if (tav::ReadCompressedSequence(tav::WriteCompressedSequence(*compiled), "again") != *compiled)
@@ -18,4 +20,8 @@ TAV_FUZZ_TARGET({
     for (int i = 0; i < 256 && stream.NextTime() != tav::EventStream::kEnd; ++i) stream.Next(event);
   }
   (void)stream.LightsOff();
-})
+}
+
+}  // namespace
+
+TAV_FUZZ_TARGET(FuzzOne(input))

@@ -84,6 +84,7 @@ class In {
   }
   void Copy(void* dst, size_t n, const char* what) {
     Need(n, what);
+    if (n == 0) return;
     std::memcpy(dst, m_p + m_pos, n);
     m_pos += n;
   }

@@ -311,6 +311,12 @@ SequenceData ParsePlainSequence(std::string_view text, const std::string& name,
     auto colon = what.rfind(": ");
     w.Fail("", "not valid JSON at " + PositionOf(text, e.byte > 0 ? e.byte - 1 : 0) +
                    (colon == std::string::npos ? "" : " (" + what.substr(colon + 2) + ")"));
+  } catch (const json::exception& e) {
+    // Numbers too large for any type end the parse this way.
+    std::string what = e.what();
+    auto bracket = what.find("] ");
+    w.Fail("", "not valid JSON (" +
+                   (bracket == std::string::npos ? what : what.substr(bracket + 2)) + ")");
   }
   w.ObjectAt(doc, "the document");
   const json* version = w.Optional(doc, "tessavar_sequence");

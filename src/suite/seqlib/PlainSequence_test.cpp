@@ -68,6 +68,7 @@ TEST(PlainSequence, BadFilesSayWhatAndWhere) {
   const BadFile cases[] = {
       {"{\"tessavar_sequence\": 1,\n \"channels\": [}", "line 2, column 15"},
       {"[1, 2]", "expected an object"},
+      {R"({"tessavar_sequence": 3e3333})", "not valid JSON (number overflow"},
       {"{}", "no \"tessavar_sequence\""},
       {R"({"tessavar_sequence": 7})", "version 7 is newer"},
       {R"({"tessavar_sequence": 1, "channels": [{"effects": []}]})", "channels[0]: no address"},
