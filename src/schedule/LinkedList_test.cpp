@@ -32,17 +32,9 @@ void ExpectList(const LinkedList& list, const std::string& names) {
   EXPECT_EQ(list.Count(), static_cast<int32_t>(names.size()));
 }
 
-TEST(LinkedList, SingleNodeListIsFirstAndLast) {
-  auto list = NewSingleNodeList(Named("a"));
-  ExpectList(*list, "a");
-  EXPECT_EQ(list->FirstNode(), list->LastNode());
-  EXPECT_EQ(list->Nodes().size(), 1u);
-  EXPECT_FALSE(list->FirstNode()->NextNode());
-  EXPECT_FALSE(list->FirstNode()->PreviousNode());
-}
-
 TEST(LinkedList, InsertsKeepBothDirectionsAndTheEnds) {
   auto list = NewSingleNodeList(Named("c"));
+  ExpectList(*list, "c");
   auto c = list->FirstNode();
   auto a = list->InsertBefore(c, Named("a"));
   EXPECT_EQ(list->FirstNode(), a);
@@ -51,7 +43,6 @@ TEST(LinkedList, InsertsKeepBothDirectionsAndTheEnds) {
   list->InsertAfter(a, Named("b"));
   list->InsertBefore(e, Named("d"));
   ExpectList(*list, "abcde");
-  EXPECT_EQ(list->Nodes().size(), 5u);
 }
 
 TEST(LinkedList, DeleteNodeUnlinksFirstMiddleAndLast) {

@@ -176,21 +176,17 @@ TEST_F(ScheduleLookupTest, NextEventEdgeCases) {
 }
 
 TEST_F(ScheduleLookupTest, LookupsChangeNothing) {
-  std::string week = ScheduleToText(*state.Week);
-  std::string year = YearScheduleToText(*state.Year);
-  std::string onDemand = state.OnDemand->Serialize();
-  auto onDemandRange = state.OnDemand->Range();
+  std::string before =
+      ScheduleToText(*state.Week) + YearScheduleToText(*state.Year) + state.OnDemand->Serialize();
   for (int hour = 0; hour < 24 * 8; hour += 5) {
     DateTime t = Dec(22).AddSeconds(int64_t{hour} * 3600);
     ShowDecision current = CurrentShowEvent(state, t);
-    current.Event->SetFilename("changed by the caller");
-    current.Event->Range()->ClearStart();
+    current.Event->Range()->ClearStart();  // the caller owns what it gets
     NextShowEvent(state, current.Event, t);
   }
-  EXPECT_EQ(ScheduleToText(*state.Week), week);
-  EXPECT_EQ(YearScheduleToText(*state.Year), year);
-  EXPECT_EQ(state.OnDemand->Serialize(), onDemand);
-  EXPECT_EQ(state.OnDemand->Range(), onDemandRange);
+  EXPECT_EQ(
+      ScheduleToText(*state.Week) + YearScheduleToText(*state.Year) + state.OnDemand->Serialize(),
+      before);
 }
 
 }  // namespace

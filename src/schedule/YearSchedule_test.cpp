@@ -239,7 +239,7 @@ TEST(YearSchedule, ReadingFailsOnBadDayRecords) {
     const char* text;
     int32_t number;
   } cases[] = {
-      {"((2024-12-24,),(2024-12-24,))", 457},
+      {"((2024-12-24,),(2024-12-24 10:00:00,))", 457},  // one date, twice
       {"((2024-12-24))", 9},
       {"(2024-12-24)", 9},
       {"((Christmas,))", 13},
@@ -253,18 +253,6 @@ TEST(YearSchedule, ReadingFailsOnBadDayRecords) {
   auto year = YearScheduleFromText("((2024-12-24,))");
   EXPECT_EQ(year->Keys(), std::vector<std::string>{"2024-12-24"});
   EXPECT_EQ(YearScheduleToText(*year), "((2024-12-24,))");
-}
-
-TEST(YearSchedule, AddScheduleRefusesADateTwice) {
-  YearSchedule year;
-  year.AddSchedule(Dec(24, 10), std::make_shared<Schedule>());
-  year.SetModified(false);
-  auto failure = FailureOf([&] { year.AddSchedule(Dec(24, 20), std::make_shared<Schedule>()); });
-  EXPECT_EQ(failure.number, 457);
-  EXPECT_TRUE(year.Modified());
-  EXPECT_EQ(year.Keys().size(), 1u);
-  EXPECT_TRUE(year.ScheduleByKey("2024-12-24"));
-  EXPECT_FALSE(year.ScheduleByKey("2024-12-25"));
 }
 
 TEST(YearSchedule, LoadingAndSavingGoThroughTheFilePort) {
@@ -289,13 +277,6 @@ TEST(YearSchedule, LoadingAndSavingGoThroughTheFilePort) {
   files.failReads = false;
   files.files["bad.tsc"] = "((2024-12-24,((252000,2,(, 0,Xmas)))))";
   EXPECT_EQ(FailureOf([&] { LoadYearSchedule("bad.tsc", files); }).number, 9);
-}
-
-TEST(YearSchedule, ADatedScheduleKeepsTheDatesWeekday) {
-  YearSchedule year;
-  year.AddShowEventByFile("Xmas", Dec(24, 18), Dec(24, 22));
-  EXPECT_EQ(Describe(*year.DateSchedule(Dec(24))),
-            "Sun 00:00-Tue 18:00 wait | Tue 18:00-Tue 22:00 Xmas | Tue 22:00-Sun 00:00 wait");
 }
 
 }  // namespace
