@@ -3,7 +3,8 @@
 // applies the answer (loads the show, sets the engine's next show, reports
 // status) and showctl prints it. Nothing here changes the schedules.
 //
-// Precedence: the show on demand when its range holds t, then a dated show
+// Precedence: the show on demand when its range holds t (start included, end
+// excluded, as for every schedule span), then a dated show
 // of the year schedule, then the week schedule. While the player runs on
 // demand only, the two schedules are ignored. Each answer says which source
 // won and why, in words a person can read.
