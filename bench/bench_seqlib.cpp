@@ -36,7 +36,8 @@ class BenchClock : public tav::Clock {
   tav::DateTime Now() const override { return tav::DateTime(); }
   uint32_t TickCount() const override {
     return static_cast<uint32_t>(
-        std::chrono::duration_cast<std::chrono::milliseconds>(Steady::now().time_since_epoch()).count());
+        std::chrono::duration_cast<std::chrono::milliseconds>(Steady::now().time_since_epoch())
+            .count());
   }
 };
 
@@ -68,10 +69,12 @@ tav::SequenceData HundredThousandEffects() {
   for (int c = 0; c < kChannels; ++c) {
     tav::SequenceChannel channel;
     channel.name = "Channel " + std::to_string(c);
-    channel.address = {c % 2 ? tav::kFamilyDMX : tav::kFamilyTAV, 1 + c / 512, c % 2 ? 0 : c / 64, 1 + c % 512};
+    channel.address = {c % 2 ? tav::kFamilyDMX : tav::kFamilyTAV, 1 + c / 512, c % 2 ? 0 : c / 64,
+                       1 + c % 512};
     for (int i = 0; i < kPerChannel; ++i) {
       int32_t type = 1 + (i + c) % 4;
-      channel.effects.push_back({i * 1500 + c, 1000 + (i % 7) * 100, type, type == tav::kEffectSet ? 80 : 10,
+      channel.effects.push_back({i * 1500 + c, 1000 + (i % 7) * 100, type,
+                                 type == tav::kEffectSet ? 80 : 10,
                                  type == tav::kEffectSet ? 80 : 90, 0});
     }
     data.channels.push_back(std::move(channel));
@@ -79,7 +82,8 @@ tav::SequenceData HundredThousandEffects() {
   return data;
 }
 
-bool PlainVersusExport(tav::FileSequenceLibrary& library, tav::FileSystem& fs, const std::string& folder) {
+bool PlainVersusExport(tav::FileSequenceLibrary& library, tav::FileSystem& fs,
+                       const std::string& folder) {
   std::string plain = folder + "effects.tseq";
   fs.WriteAll(plain, tav::WritePlainSequence(HundredThousandEffects()));
   auto sequence = library.CreateSequence();
@@ -92,9 +96,10 @@ bool PlainVersusExport(tav::FileSequenceLibrary& library, tav::FileSystem& fs, c
   double ratio = plainMs / exportMs;
   std::printf("plain sequence of %zu effects (%.1f MB): load %.1f ms\n", effects,
               fs.Stat(plain).size / 1e6, plainMs);
-  std::printf("its compressed export (%.2f MB):        load %.1f ms\n", fs.Stat(plain + ".tcs").size / 1e6,
-              exportMs);
-  std::printf("  export loads %.1fx faster (target: at least 10x) %s\n", ratio, ratio >= 10 ? "ok" : "MISSED");
+  std::printf("its compressed export (%.2f MB):        load %.1f ms\n",
+              fs.Stat(plain + ".tcs").size / 1e6, exportMs);
+  std::printf("  export loads %.1fx faster (target: at least 10x) %s\n", ratio,
+              ratio >= 10 ? "ok" : "MISSED");
   return ratio >= 10;
 }
 
@@ -128,19 +133,23 @@ double OpenAndReadMiddle(tav::FileSystem& fs, const std::string& path) {
   });
 }
 
-bool FseqFigures(tav::FileSequenceLibrary& library, tav::FileSystem& fs, const std::string& folder) {
+bool FseqFigures(tav::FileSequenceLibrary& library, tav::FileSystem& fs,
+                 const std::string& folder) {
   bool ok = true;
   auto start = Steady::now();
   std::string shortFile = WriteFseq(fs, folder + "show.fseq", 2400);
   std::string longFile = WriteFseq(fs, folder + "show-twice.fseq", 4800);
-  std::printf("\nFSEQ of %u channels, zstd, %u frames per block (written in %.0f ms)\n", kFseqChannels,
-              kBlockFrames, MsSince(start));
+  std::printf("\nFSEQ of %u channels, zstd, %u frames per block (written in %.0f ms)\n",
+              kFseqChannels, kBlockFrames, MsSince(start));
   double shortMs = OpenAndReadMiddle(fs, shortFile);
   double longMs = OpenAndReadMiddle(fs, longFile);
-  std::printf("  2,400 frames (%.1f MB): open and read frame 1,200: %.2f ms (target: under 50 ms) %s\n",
-              fs.Stat(shortFile).size / 1e6, shortMs, shortMs < 50 ? "ok" : "MISSED");
-  std::printf("  4,800 frames (%.1f MB): open and read frame 2,400: %.2f ms (target: about the same) %s\n",
-              fs.Stat(longFile).size / 1e6, longMs, longMs < 50 && longMs < 2 * shortMs + 2 ? "ok" : "MISSED");
+  std::printf(
+      "  2,400 frames (%.1f MB): open and read frame 1,200: %.2f ms (target: under 50 ms) %s\n",
+      fs.Stat(shortFile).size / 1e6, shortMs, shortMs < 50 ? "ok" : "MISSED");
+  std::printf(
+      "  4,800 frames (%.1f MB): open and read frame 2,400: %.2f ms (target: about the same) %s\n",
+      fs.Stat(longFile).size / 1e6, longMs,
+      longMs < 50 && longMs < 2 * shortMs + 2 ? "ok" : "MISSED");
   ok = ok && shortMs < 50 && longMs < 50 && longMs < 2 * shortMs + 2;
 
   const size_t block = static_cast<size_t>(kBlockFrames) * kFseqChannels;
@@ -158,11 +167,12 @@ bool FseqFigures(tav::FileSequenceLibrary& library, tav::FileSystem& fs, const s
     }
     double playMs = MsSince(playStart);
     double multiple = static_cast<double>(peak) / block;
-    std::printf("  playing %s: %zu events in %.0f ms (%.1f us per frame); memory held %.2f MB = %.2f x one "
-                "block of %.2f MB (target: at most 3x) %s\n",
-                std::filesystem::path(path).filename().c_str(), events, playMs,
-                playMs * 1000 / sequence->Info().frameCount, peak / 1e6, multiple, block / 1e6,
-                multiple <= 3 ? "ok" : "MISSED");
+    std::printf(
+        "  playing %s: %zu events in %.0f ms (%.1f us per frame); memory held %.2f MB = %.2f x one "
+        "block of %.2f MB (target: at most 3x) %s\n",
+        std::filesystem::path(path).filename().c_str(), events, playMs,
+        playMs * 1000 / sequence->Info().frameCount, peak / 1e6, multiple, block / 1e6,
+        multiple <= 3 ? "ok" : "MISSED");
     ok = ok && multiple <= 3;
   }
   return ok;
