@@ -459,16 +459,14 @@ void Register(CLI::App& app) {
       "(files: $TAV_USER_DATA, else $XDG_DATA_HOME/tessavar/, else ~/.local/share/tessavar/,\n"
       "weeksched.tsc and yearsched.tsc)");
   schedule->require_subcommand(1);
-  auto weekOption = [o](CLI::App* command) {
+  // Every command takes both files, so scripts can pass the same options to all.
+  auto fileOptions = [o](CLI::App* command) {
     command->add_option("--week", o->week, "Week schedule file to use instead of the usual one");
-  };
-  auto yearOption = [o](CLI::App* command) {
     command->add_option("--year", o->year, "Year schedule file to use instead of the usual one");
   };
 
   auto* list = schedule->add_subcommand("list", "List the weekly and the dated shows");
-  weekOption(list);
-  yearOption(list);
+  fileOptions(list);
   list->callback([o] { List(*o); });
 
   auto* add = schedule->add_subcommand("add", "Add a weekly or a dated show");
@@ -478,7 +476,7 @@ void Register(CLI::App& app) {
   addWeekly->add_option("from", o->from, "Start, a day and a time: \"Mon 18:00\"")->required();
   addWeekly->add_option("to", o->to, "End (not included): \"Mon 22:00\", \"Sun 01:00\"")
       ->required();
-  weekOption(addWeekly);
+  fileOptions(addWeekly);
   addWeekly->callback([o] { AddWeekly(*o); });
   auto* addDated = add->add_subcommand("dated", "Add a show on one date");
   addDated->add_option("show", o->file, "Show file")->required();
@@ -488,18 +486,18 @@ void Register(CLI::App& app) {
                    "End (not included): \"2024-12-24 22:00\", or a time alone (\"01:00\": "
                    "the next such time after the start)")
       ->required();
-  yearOption(addDated);
+  fileOptions(addDated);
   addDated->callback([o] { AddDated(*o); });
 
   auto* remove = schedule->add_subcommand("remove", "Remove a weekly or a dated show");
   remove->require_subcommand(1);
   auto* removeWeekly = remove->add_subcommand("weekly", "Remove the weekly show running at a time");
   removeWeekly->add_option("at", o->at, "A time within the show: \"Mon 18:00\"")->required();
-  weekOption(removeWeekly);
+  fileOptions(removeWeekly);
   removeWeekly->callback([o] { RemoveWeekly(*o); });
   auto* removeDated = remove->add_subcommand("dated", "Remove the dated show running at a time");
   removeDated->add_option("at", o->at, "A time within the show: \"2024-12-24 18:00\"")->required();
-  yearOption(removeDated);
+  fileOptions(removeDated);
   removeDated->callback([o] { RemoveDated(*o); });
 
   auto* check = schedule->add_subcommand(
@@ -514,8 +512,7 @@ void Register(CLI::App& app) {
   at->add_option("time", o->at, "Date and time, \"2024-12-24 19:00\" (default: now)");
   at->add_flag("--on-demand-only", o->onDemandOnly,
                "As the player started with /noschedule: the schedules do not count");
-  weekOption(at);
-  yearOption(at);
+  fileOptions(at);
   at->callback([o] { At(*o); });
 }
 

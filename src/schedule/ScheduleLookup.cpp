@@ -61,7 +61,16 @@ std::optional<Occurrence> NextWeeklyShow(const Schedule& week, DateTime from) {
   if (!node) return std::nullopt;
   for (int32_t steps = 0; steps < week.Count(); ++steps) {
     if (node->Obj()->EventType() == kEventTypeShow) {
-      return Occurrence{node->Obj(), node->Obj()->Range(from)};
+      auto range = node->Obj()->Range(from);
+      // Range gives the occurrence that ends exactly at `from` (the one just
+      // over, when the walk came round to the show that is ending); the next
+      // one is a week later.
+      if (range->HasStart() && range->HasEnd() && range->EndTime() <= from) {
+        DateTime start = range->StartTime().AddDays(7), end = range->EndTime().AddDays(7);
+        range->SetEndTime(end);
+        range->SetStartTime(start);
+      }
+      return Occurrence{node->Obj(), range};
     }
     node = node->NextNode() ? node->NextNode() : week.FirstNode();
   }

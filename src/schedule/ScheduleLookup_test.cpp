@@ -163,6 +163,15 @@ TEST_F(ScheduleLookupTest, NextEventEdgeCases) {
   state.Year = year;
   EXPECT_EQ(Summary(NextShowEvent(state, nullptr, Dec(30, 12))),
             "year schedule Dated 2024-12-30 18:00:00 - 2024-12-30 19:00:00 type 2");
+  // The only weekly show follows itself a week later.
+  auto single = std::make_shared<Schedule>();
+  single->AddShowEventByFile("Xmas", T("Mon 18:00"), T("Mon 22:00"));
+  ScheduleState alone;
+  alone.Week = single;
+  for (DateTime t : {Dec(23, 19), Dec(23, 21, 59)}) {
+    EXPECT_EQ(Summary(NextShowEvent(alone, CurrentShowEvent(alone, t).Event, t)),
+              "week schedule Xmas 2024-12-30 18:00:00 - 2024-12-30 22:00:00 type 1");
+  }
   // Nothing follows a show that never ends.
   ShowDecision forever = NextShowEvent(state, Requested("Always", nullptr), Dec(30, 12));
   EXPECT_EQ(Summary(forever), "nothing none");
