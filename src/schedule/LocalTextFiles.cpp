@@ -62,6 +62,11 @@ std::string FolderOf(const std::string& path) {
 
 }  // namespace
 
+TextFileStore& DefaultTextFileStore() {
+  static LocalTextFiles files;
+  return files;
+}
+
 std::optional<std::string> LocalTextFiles::ReadText(const std::string& path) {
   constexpr const char* kSource = "LocalTextFiles.ReadText";
   Descriptor fd(::open(path.c_str(), O_RDONLY | O_CLOEXEC));

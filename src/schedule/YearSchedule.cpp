@@ -4,6 +4,7 @@
 #include <cmath>
 #include <cstdio>
 
+#include "schedule/LocalTextFiles.h"
 #include "support/Error.h"
 #include "support/Numbers.h"
 #include "support/Serialize.h"
@@ -211,10 +212,24 @@ std::shared_ptr<YearSchedule> YearScheduleFromText(std::string_view text) {
 }
 
 std::shared_ptr<YearSchedule> LoadYearSchedule(const std::string& path, TextFileStore& files) {
-  std::optional<std::string> text = files.ReadText(path);
+  std::optional<std::string> text;
+  try {
+    text = files.ReadText(path);
+  } catch (const Error&) {
+    // An unreadable file counts as no file: the player starts with no dated
+    // shows rather than not at all.
+  }
   auto yearSchedule = text ? YearScheduleFromText(*text) : std::make_shared<YearSchedule>();
   yearSchedule->SetModified(false);
   return yearSchedule;
+}
+
+std::shared_ptr<YearSchedule> LoadYearSchedule(const std::string& path) {
+  return LoadYearSchedule(path, DefaultTextFileStore());
+}
+
+bool YearSchedule::Save(const std::string& szFilename) {
+  return Save(szFilename, DefaultTextFileStore());
 }
 
 }  // namespace tav

@@ -56,6 +56,8 @@ class YearSchedule {
 
   // Writes the year schedule file; Modified is cleared whatever the result.
   bool Save(const std::string& szFilename, TextFileStore& files);
+  // On the local file system.
+  bool Save(const std::string& szFilename);
 
  private:
   std::vector<std::string> m_keys;
@@ -69,7 +71,9 @@ class YearSchedule {
 std::string YearScheduleToText(const YearSchedule& yearSchedule);
 std::shared_ptr<YearSchedule> YearScheduleFromText(std::string_view text);
 // The year schedule file: a new empty year schedule when the file does not
-// exist; Modified cleared after loading. Read and format errors are thrown.
+// exist or cannot be read; Modified cleared after loading. A file that reads
+// but is no year schedule fails with the reader's error.
 std::shared_ptr<YearSchedule> LoadYearSchedule(const std::string& path, TextFileStore& files);
+std::shared_ptr<YearSchedule> LoadYearSchedule(const std::string& path);
 
 }  // namespace tav
