@@ -15,7 +15,7 @@
 #include <string>
 #include <vector>
 
-#include "schedule/LocalTextFiles.h"
+#include "platform/LocalTextFiles.h"
 #include "schedule/ScheduleLookup.h"
 #include "schedule/YearSchedule.h"
 

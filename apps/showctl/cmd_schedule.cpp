@@ -21,7 +21,7 @@
 #include <vector>
 
 #include "CommandRegistry.h"
-#include "schedule/LocalTextFiles.h"
+#include "platform/LocalTextFiles.h"
 #include "schedule/Schedule.h"
 #include "schedule/ScheduleFileCheck.h"
 #include "schedule/ScheduleLookup.h"

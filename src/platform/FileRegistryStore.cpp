@@ -1,5 +1,7 @@
 #include "platform/FileRegistryStore.h"
 
+#include "platform/PosixFiles.h"
+
 #include <fcntl.h>
 #include <sys/file.h>
 #include <sys/stat.h>
@@ -20,26 +22,6 @@ std::string ErrnoText(int error) {
   return std::strerror(error);
 }
 
-// Closes a descriptor on every path out of a function.
-class FileDescriptor {
- public:
-  explicit FileDescriptor(int fd = -1) : m_fd(fd) {}
-  ~FileDescriptor() {
-    if (m_fd >= 0) ::close(m_fd);
-  }
-  FileDescriptor(const FileDescriptor&) = delete;
-  FileDescriptor& operator=(const FileDescriptor&) = delete;
-  int Get() const { return m_fd; }
-  int Release() {
-    int fd = m_fd;
-    m_fd = -1;
-    return fd;
-  }
-
- private:
-  int m_fd;
-};
-
 bool ReadAll(int fd, std::string& out) {
   char buffer[65536];
   while (true) {
@@ -51,23 +33,6 @@ bool ReadAll(int fd, std::string& out) {
     }
     out.append(buffer, static_cast<size_t>(n));
   }
-}
-
-bool WriteAll(int fd, std::string_view data) {
-  while (!data.empty()) {
-    ssize_t n = ::write(fd, data.data(), data.size());
-    if (n < 0) {
-      if (errno == EINTR) continue;
-      return false;
-    }
-    data.remove_prefix(static_cast<size_t>(n));
-  }
-  return true;
-}
-
-std::string ParentFolder(const std::string& path) {
-  std::string parent = std::filesystem::path(path).parent_path().string();
-  return parent.empty() ? "." : parent;
 }
 
 }  // namespace
@@ -130,27 +95,12 @@ const RegistryDocument* FileRegistryStore::Content() {
 }
 
 int32_t FileRegistryStore::WriteFile(const RegistryDocument& document, Identity& written) {
-  const std::string temp = m_path + ".tmp." + std::to_string(::getpid());
-  const std::string text = FormatRegistryFile(document);
-  // Keep the permissions someone gave the file.
-  mode_t mode = 0644;
-  struct stat old {};
-  if (::stat(m_path.c_str(), &old) == 0) mode = old.st_mode & 07777;
-
-  FileDescriptor fd(::open(temp.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, mode));
   struct stat status {};
-  bool ok = fd.Get() >= 0 && ::fchmod(fd.Get(), mode) == 0 && WriteAll(fd.Get(), text) &&
-            ::fsync(fd.Get()) == 0 && ::fstat(fd.Get(), &status) == 0 &&
-            ::close(fd.Release()) == 0 && ::rename(temp.c_str(), m_path.c_str()) == 0;
-  if (!ok) {
-    int error = errno;
-    ::unlink(temp.c_str());
+  int error = ReplaceFileContents(m_path, FormatRegistryFile(document), &status);
+  if (error != 0) {
     Report("cannot write settings: " + ErrnoText(error));
     return kRegistryIoFailed;
   }
-  // Make the rename itself durable.
-  FileDescriptor folder(::open(ParentFolder(m_path).c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-  if (folder.Get() >= 0) ::fsync(folder.Get());
   written = Identity{true, status.st_dev, status.st_ino, status.st_size,
                      status.st_mtim.tv_sec * 1'000'000'000LL + status.st_mtim.tv_nsec};
   return kRegistryOk;
@@ -158,7 +108,7 @@ int32_t FileRegistryStore::WriteFile(const RegistryDocument& document, Identity&
 
 int32_t FileRegistryStore::Update(const std::function<int32_t(RegistryDocument&)>& change) {
   std::error_code error;
-  std::filesystem::create_directories(ParentFolder(m_path), error);
+  std::filesystem::create_directories(FolderOf(m_path), error);
   if (error) {
     Report("cannot create the settings folder: " + error.message());
     return kRegistryIoFailed;

@@ -2,7 +2,7 @@
 
 #include <vector>
 
-#include "schedule/LocalTextFiles.h"
+#include "platform/LocalTextFiles.h"
 #include "support/Error.h"
 #include "support/Serialize.h"
 

@@ -4,7 +4,7 @@
 #include <cmath>
 #include <cstdio>
 
-#include "schedule/LocalTextFiles.h"
+#include "platform/LocalTextFiles.h"
 #include "support/Error.h"
 #include "support/Numbers.h"
 #include "support/Serialize.h"

@@ -8,7 +8,10 @@
 #include <cerrno>
 #include <cstring>
 
+#include "platform/PosixFiles.h"
 #include "suite/seqlib/FileSystem.h"
+
+#include "platform/PosixFiles.h"
 #include "suite/seqlib/SeqErrors.h"
 
 namespace tav {
@@ -76,27 +79,9 @@ class LocalFileSystemImpl : public FileSystem {
   }
 
   void WriteAll(const std::string& path, std::string_view bytes) override {
-    std::string temp = path + ".tmp" + std::to_string(::getpid());
-    int fd = ::open(temp.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0644);
-    if (fd < 0) {
-      throw seqerrors::FileAccess("FileSystem.WriteAll", path + ": " + std::strerror(errno));
-    }
-    size_t done = 0;
-    while (done < bytes.size()) {
-      ssize_t n = ::write(fd, bytes.data() + done, bytes.size() - done);
-      if (n < 0) {
-        if (errno == EINTR) continue;
-        int err = errno;
-        ::close(fd);
-        ::unlink(temp.c_str());
-        throw seqerrors::FileAccess("FileSystem.WriteAll", path + ": " + std::strerror(err));
-      }
-      done += static_cast<size_t>(n);
-    }
-    if (::close(fd) != 0 || ::rename(temp.c_str(), path.c_str()) != 0) {
-      int err = errno;
-      ::unlink(temp.c_str());
-      throw seqerrors::FileAccess("FileSystem.WriteAll", path + ": " + std::strerror(err));
+    int error = ReplaceFileContents(path, bytes);
+    if (error != 0) {
+      throw seqerrors::FileAccess("FileSystem.WriteAll", path + ": " + std::strerror(error));
     }
   }
 

@@ -1,4 +1,4 @@
-#include "schedule/LocalTextFiles.h"
+#include "platform/LocalTextFiles.h"
 
 #include <gtest/gtest.h>
 #include <sys/stat.h>
@@ -8,8 +8,6 @@
 #include <filesystem>
 #include <fstream>
 
-#include "schedule/Schedule.h"
-#include "schedule/YearSchedule.h"
 #include "support/Error.h"
 
 namespace tav {
@@ -85,28 +83,6 @@ TEST_F(LocalTextFilesTest, AFailedWriteLeavesThePreviousFileAndNoTemporary) {
   }
   EXPECT_EQ(files.ReadText(Path("weeksched.tsc")), "previous\r\n");
   EXPECT_EQ(Entries(), std::vector<std::string>{"weeksched.tsc"});
-}
-
-}  // namespace
-}  // namespace tav
-
-namespace tav {
-namespace {
-
-// The overloads without a store use the local file system.
-TEST(LocalTextFiles, OneArgumentSaveAndLoadUseTheLocalFiles) {
-  char pattern[] = "/tmp/tav-sched-XXXXXX";
-  ASSERT_NE(mkdtemp(pattern), nullptr);
-  const std::string dir = pattern;
-  Schedule week;
-  week.AddShowEventByFile("Xmas", NewWeekTime(1, 18, 0, 0), NewWeekTime(1, 22, 0, 0));
-  EXPECT_TRUE(week.Save(dir + "/weeksched.tsc"));
-  EXPECT_FALSE(week.Modified());
-  EXPECT_FALSE(week.Save(dir + "/no/such/folder/weeksched.tsc"));
-  EXPECT_TRUE(WriteTextFile(dir + "/yearsched.tsc", ""));
-  EXPECT_TRUE(LoadYearSchedule(dir + "/yearsched.tsc")->Keys().empty());
-  EXPECT_TRUE(LoadYearSchedule(dir + "/missing.tsc")->Keys().empty());
-  std::filesystem::remove_all(dir);
 }
 
 }  // namespace
