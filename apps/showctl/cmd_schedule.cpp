@@ -2,14 +2,17 @@
 // suite's schedule editor, check schedule and show files, and ask which show
 // the player would run at a given time.
 //
-// The files are found as the player finds them, in the user data folder:
-// $TAV_USER_DATA, else $XDG_DATA_HOME/tessavar/, else ~/.local/share/tessavar/
-// ("weeksched.tsc" and "yearsched.tsc"); --week and --year name others.
+// The files are found as the player finds them, in the user data folder (the
+// UserDataPath setting, else $XDG_DATA_HOME/tessavar/, else
+// ~/.local/share/tessavar/): "weeksched.tsc" and "yearsched.tsc"; --week and
+// --year name others.
 // Every change is saved through the schedule library's file store, which
 // writes a temporary file and renames it, and only after the whole change
 // has succeeded: a failed command never leaves a damaged file.
 
 #include <fmt/format.h>
+
+#include "UserData.h"
 
 #include <algorithm>
 #include <cstdlib>
@@ -50,19 +53,6 @@ struct ScheduleOptions {
   std::string kind = "auto";
   bool onDemandOnly = false;
 };
-
-std::string UserDataFolder() {
-  auto withSlash = [](std::string folder) {
-    if (!folder.empty() && folder.back() != '/') folder += '/';
-    return folder;
-  };
-  if (const char* own = std::getenv("TAV_USER_DATA"); own && *own) return withSlash(own);
-  if (const char* xdg = std::getenv("XDG_DATA_HOME"); xdg && *xdg) {
-    return withSlash(xdg) + "tessavar/";
-  }
-  const char* home = std::getenv("HOME");
-  return withSlash(home && *home ? home : ".") + ".local/share/tessavar/";
-}
 
 std::string WeekPath(const ScheduleOptions& o) {
   return o.week.empty() ? UserDataFolder() + "weeksched.tsc" : o.week;
@@ -456,8 +446,8 @@ void Register(CLI::App& app) {
   auto* schedule = app.add_subcommand(
       "schedule",
       "Make and read the week and year schedules, check schedule and show files\n"
-      "(files: $TAV_USER_DATA, else $XDG_DATA_HOME/tessavar/, else ~/.local/share/tessavar/,\n"
-      "weeksched.tsc and yearsched.tsc)");
+      "(files: weeksched.tsc and yearsched.tsc in the UserDataPath setting's folder,\n"
+      "else $XDG_DATA_HOME/tessavar/, else ~/.local/share/tessavar/)");
   schedule->require_subcommand(1);
   // Every command takes both files, so scripts can pass the same options to all.
   auto fileOptions = [o](CLI::App* command) {

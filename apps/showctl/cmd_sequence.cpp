@@ -5,6 +5,8 @@
 
 #include <fmt/format.h>
 
+#include "UserData.h"
+
 #include <cctype>
 #include <iostream>
 #include <map>
@@ -31,8 +33,7 @@ struct SequenceOptions {
 
 std::shared_ptr<FileSequenceLibrary> MakeLibrary(const SequenceOptions& o) {
   auto fs = LocalFileSystem();
-  PathResolver::FolderLookup folders =
-      PathResolver::DefaultFolders(SystemPathDefaults().userDataFolder);
+  PathResolver::FolderLookup folders = PathResolver::DefaultFolders(UserDataFolder());
   if (!o.folder.empty()) {
     std::string folder = o.folder;
     folders = [folder](int32_t) { return folder; };

@@ -78,3 +78,19 @@ TEST_F(SettingsCommand, EveryCommandHasHelp) {
 
 }  // namespace
 }  // namespace tav::showctl::testing
+
+namespace tav::showctl::testing {
+namespace {
+
+// Schedules are looked for where the settings say the user data lives.
+TEST_F(SettingsCommand, ScheduleCommandsFollowTheUserDataPathSetting) {
+  std::filesystem::create_directory(Path("shows"));
+  ASSERT_EQ(Run({"settings", "set", "UserDataPath", Path("shows")}).exitCode, 0);
+  Result add = Run({"schedule", "add", "weekly", "Xmas.tss", "Mon 18:00", "Mon 22:00"});
+  EXPECT_EQ(add.exitCode, 0) << add.err;
+  EXPECT_TRUE(std::filesystem::exists(Path("shows/weeksched.tsc")));
+  EXPECT_FALSE(std::filesystem::exists(Path("tessavar/weeksched.tsc")));
+}
+
+}  // namespace
+}  // namespace tav::showctl::testing
