@@ -7,6 +7,9 @@ cd "$(dirname "$0")/.."
 bash scripts/install-deps.sh
 cmake --preset dev
 cmake --build build/dev -j "$(nproc)"
-ctest --preset dev -j "$(nproc)"
+ctest --preset dev -j "$(nproc)" | tee build/dev/ctest.log
 bash scripts/fuzz.sh
-echo "test.sh: all tests passed"
+fuzzed=$(ls build/fuzz/fuzz/fuzz_* 2>/dev/null | grep -c . || true)
+passed=$(sed -n 's/.* tests passed, 0 tests failed out of \([0-9]*\)$/\1/p' build/dev/ctest.log)
+echo "fuzz targets run clean: $fuzzed"
+echo "tests: ${passed:-0} passed, 0 failed"
