@@ -1,4 +1,5 @@
 #include "platform/LocalTextFiles.h"
+#include "support/testing/Failure.h"
 
 #include <gtest/gtest.h>
 #include <sys/stat.h>
@@ -35,14 +36,6 @@ class LocalTextFilesTest : public ::testing::Test {
     std::sort(names.begin(), names.end());
     return names;
   }
-  int32_t ErrorNumberOf(const std::function<void()>& action) {
-    try {
-      action();
-    } catch (const Error& e) {
-      return e.Number();
-    }
-    return 0;
-  }
 
   LocalTextFiles files;
   std::string m_folder;
@@ -60,7 +53,8 @@ TEST_F(LocalTextFilesTest, WritesAndReadsWholeTexts) {
 
 TEST_F(LocalTextFilesTest, AMissingFileReadsAsNothing) {
   EXPECT_EQ(files.ReadText(Path("missing.tsc")), std::nullopt);
-  EXPECT_NE(ErrorNumberOf([&] { files.ReadText(m_folder); }), 0);  // a folder is no file
+  EXPECT_NE(tav::testing::FailureOf([&] { files.ReadText(m_folder); }).number,
+            0);  // a folder is no file
 }
 
 TEST_F(LocalTextFilesTest, AnOverwrittenFileKeepsItsPermissions) {
@@ -74,11 +68,16 @@ TEST_F(LocalTextFilesTest, AnOverwrittenFileKeepsItsPermissions) {
 
 TEST_F(LocalTextFilesTest, AFailedWriteLeavesThePreviousFileAndNoTemporary) {
   files.WriteText(Path("weeksched.tsc"), "previous\r\n");
-  EXPECT_EQ(ErrorNumberOf([&] { files.WriteText(Path("no/such/folder.tsc"), "x"); }), 76);
-  EXPECT_NE(ErrorNumberOf([&] { files.WriteText(m_folder, "x"); }), 0);  // onto a folder
+  EXPECT_EQ(
+      tav::testing::FailureOf([&] { files.WriteText(Path("no/such/folder.tsc"), "x"); }).number,
+      76);
+  EXPECT_NE(tav::testing::FailureOf([&] { files.WriteText(m_folder, "x"); }).number,
+            0);            // onto a folder
   if (::geteuid() != 0) {  // permissions do not hold back root
     fs::permissions(m_folder, fs::perms::owner_read | fs::perms::owner_exec);
-    EXPECT_EQ(ErrorNumberOf([&] { files.WriteText(Path("weeksched.tsc"), "new\r\n"); }), 70);
+    EXPECT_EQ(
+        tav::testing::FailureOf([&] { files.WriteText(Path("weeksched.tsc"), "new\r\n"); }).number,
+        70);
     fs::permissions(m_folder, fs::perms::owner_all);
   }
   EXPECT_EQ(files.ReadText(Path("weeksched.tsc")), "previous\r\n");

@@ -1,4 +1,5 @@
 #include "schedule/ShowEvent.h"
+#include "support/testing/Failure.h"
 
 #include <gtest/gtest.h>
 
@@ -6,15 +7,6 @@
 
 namespace tav {
 namespace {
-
-int32_t ErrorNumberOf(const std::function<void()>& action) {
-  try {
-    action();
-  } catch (const Error& e) {
-    return e.Number();
-  }
-  return 0;
-}
 
 DateTime Date(int month, int day, int hour = 0, int minute = 0) {
   return DateTime::FromParts(2024, month, day, hour, minute, 0);
@@ -54,7 +46,7 @@ TEST(ShowEvent, DurationCarriesTheEndWhenTheEndIsDropped) {
   auto e = NewShowEvent("A", NewWeekTime(1, 10, 0, 0), NewWeekTime(1, 12, 0, 0));
   // Dropping the end fails when the duration is recomputed, but the end is
   // gone and the duration (2 h) stays known.
-  EXPECT_EQ(ErrorNumberOf([&] { e->SetEndTime(nullptr); }), 91);
+  EXPECT_EQ(tav::testing::FailureOf([&] { e->SetEndTime(nullptr); }).number, 91);
   EXPECT_FALSE(e->EndTime());
   e->SetStartTime(NewWeekTime(6, 23, 0, 0));
   ASSERT_TRUE(e->EndTime());
@@ -65,9 +57,9 @@ TEST(ShowEvent, DerivingAStartFromTheEndFails) {
   auto e = NewShowEvent("A", NewWeekTime(1, 10, 0, 0), NewWeekTime(1, 12, 0, 0));
   // Dropping the start fails when the duration is recomputed, but the start
   // is gone; the next end write then needs MinusDuration, which never works.
-  EXPECT_EQ(ErrorNumberOf([&] { e->SetStartTime(nullptr); }), 91);
+  EXPECT_EQ(tav::testing::FailureOf([&] { e->SetStartTime(nullptr); }).number, 91);
   EXPECT_FALSE(e->StartTime());
-  EXPECT_EQ(ErrorNumberOf([&] { e->SetEndTime(NewWeekTime(2, 0, 0, 0)); }), 91);
+  EXPECT_EQ(tav::testing::FailureOf([&] { e->SetEndTime(NewWeekTime(2, 0, 0, 0)); }).number, 91);
 }
 
 TEST(ShowEvent, SetDurationOfAWeekFillsTheWeek) {
@@ -144,7 +136,7 @@ TEST(ShowEvent, MalformedRecordsFailWithTheirErrors) {
   };
   for (const auto& c : cases) {
     SCOPED_TRACE(c.text);
-    EXPECT_EQ(ErrorNumberOf([&] { ShowEventFromText(c.text); }), c.number);
+    EXPECT_EQ(tav::testing::FailureOf([&] { ShowEventFromText(c.text); }).number, c.number);
   }
 }
 

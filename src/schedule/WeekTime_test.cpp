@@ -1,4 +1,5 @@
 #include "schedule/WeekTime.h"
+#include "support/testing/Failure.h"
 
 #include <gtest/gtest.h>
 
@@ -27,15 +28,6 @@ WeekTime At(int32_t timeVal) {
   return w;
 }
 
-int32_t ErrorNumberOf(const std::function<void()>& action) {
-  try {
-    action();
-  } catch (const Error& e) {
-    return e.Number();
-  }
-  return 0;
-}
-
 TEST(WeekTime, WritingTimeValWrapsAndDerivesTheParts) {
   struct Case {
     int32_t written;
@@ -59,7 +51,7 @@ TEST(WeekTime, WritingTimeValWrapsAndDerivesTheParts) {
 TEST(WeekTime, TimeValNearTheTopOfThe32BitRangeOverflows) {
   constexpr int32_t kLargest = std::numeric_limits<int32_t>::max() - kSecondsPerWeek;
   EXPECT_EQ(At(kLargest).TimeVal(), kLargest % kSecondsPerWeek);
-  EXPECT_EQ(ErrorNumberOf([] { At(kLargest + 1); }), 6);
+  EXPECT_EQ(tav::testing::FailureOf([] { At(kLargest + 1); }).number, 6);
   EXPECT_EQ(At(std::numeric_limits<int32_t>::min()).TimeVal(),
             (std::numeric_limits<int32_t>::min() + kSecondsPerWeek) % kSecondsPerWeek);
 }
@@ -143,7 +135,10 @@ TEST(WeekTime, PlusDurationMakesANewNormalisedTime) {
   EXPECT_EQ(saturday.TimeVal(), 6 * kSecondsPerDay + 23 * 3600);
   EXPECT_EQ(At(0).PlusDuration(kSecondsPerWeek)->TimeVal(), 0);
   EXPECT_EQ(At(10).PlusDuration(-20)->TimeVal(), 604790);
-  EXPECT_EQ(ErrorNumberOf([] { At(10).PlusDuration(std::numeric_limits<int32_t>::max()); }), 6);
+  EXPECT_EQ(tav::testing::FailureOf([] {
+              At(10).PlusDuration(std::numeric_limits<int32_t>::max());
+            }).number,
+            6);
 }
 
 TEST(WeekTime, MinusDurationNeverYieldsATime) {
@@ -155,7 +150,10 @@ TEST(WeekTime, MinusDurationNeverYieldsATime) {
     EXPECT_EQ(e.Description(), "Object variable or With block variable not set");
   }
   // The subtraction is checked first.
-  EXPECT_EQ(ErrorNumberOf([] { At(5000).MinusDuration(std::numeric_limits<int32_t>::min()); }), 6);
+  EXPECT_EQ(tav::testing::FailureOf([] {
+              At(5000).MinusDuration(std::numeric_limits<int32_t>::min());
+            }).number,
+            6);
 }
 
 TEST(WeekTime, ToStringIsCompactWithoutSeparators) {
@@ -199,8 +197,8 @@ TEST(WeekTime, FromTextReadsTheLeadingNumberRoundedHalfToEven) {
     SCOPED_TRACE(c.field);
     EXPECT_EQ(WeekTimeFromText(c.field)->TimeVal(), c.timeVal);
   }
-  EXPECT_EQ(ErrorNumberOf([] { WeekTimeFromText("99999999999"); }), 6);
-  EXPECT_EQ(ErrorNumberOf([] { WeekTimeFromText("2147483000"); }), 6);
+  EXPECT_EQ(tav::testing::FailureOf([] { WeekTimeFromText("99999999999"); }).number, 6);
+  EXPECT_EQ(tav::testing::FailureOf([] { WeekTimeFromText("2147483000"); }).number, 6);
 }
 
 TEST(WeekTime, ToDateFindsTheTimeInTheReferenceWeek) {

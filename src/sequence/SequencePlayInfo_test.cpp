@@ -1,20 +1,17 @@
 #include "sequence/SequencePlayInfo.h"
 
-#include <fcntl.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-#include <sys/stat.h>
-#include <unistd.h>
 
 #include <cstdlib>
 #include <filesystem>
-#include <fstream>
 
 #include "platform/testing/FixedProcessMemory.h"
 #include "platform/testing/ManualClock.h"
 #include "suite/seqlib/FileSequenceLibrary.h"
 #include "suite/seqlib/PlainSequence.h"
 #include "suite/seqlib/testing/MemorySequenceLibrary.h"
+#include "suite/seqlib/testing/TempFolder.h"
 #include "suite/shellcmd/testing/RecordingShellCommandManager.h"
 #include "support/Error.h"
 
@@ -65,21 +62,17 @@ SequenceData TwoChannels(const std::string& media = "") {
 class ExportDecision : public ::testing::Test {
  protected:
   void SetUp() override {
-    char pattern[] = "/tmp/tav-spi-XXXXXX";
-    ASSERT_NE(mkdtemp(pattern), nullptr);
-    m_dir = pattern;
     auto files = LocalFileSystem();
     auto resolver =
-        std::make_shared<PathResolver>(files, [dir = m_dir](int32_t) { return dir + "/"; });
+        std::make_shared<PathResolver>(files, [dir = m_dir.Path()](int32_t) { return dir; });
     m_library = std::make_shared<FileSequenceLibrary>(m_clock, files, resolver);
     m_services = {m_library, resolver, files, &m_host, nullptr, [this] { return m_useCompressed; }};
   }
-  void TearDown() override { std::filesystem::remove_all(m_dir); }
 
-  std::string Path(const std::string& name) const { return m_dir + "/" + name; }
+  std::string Path(const std::string& name) const { return m_dir.Path() + name; }
 
   void WriteFile(const std::string& name, const std::string& bytes, int64_t mtimeSeconds) {
-    std::ofstream(Path(name), std::ios::binary) << bytes;
+    m_dir.Write(name, bytes);
     SetTime(name, mtimeSeconds);
   }
   void WritePlain(const std::string& name, int64_t mtimeSeconds,
@@ -93,10 +86,7 @@ class ExportDecision : public ::testing::Test {
     m_library->WriteCompressed(*sequence, Path(name) + ".tcs");
     SetTime(name + ".tcs", mtimeSeconds);
   }
-  void SetTime(const std::string& name, int64_t seconds) {
-    timespec times[2] = {{seconds, 0}, {seconds, 0}};
-    ASSERT_EQ(utimensat(AT_FDCWD, Path(name).c_str(), times, 0), 0);
-  }
+  void SetTime(const std::string& name, int64_t seconds) { m_dir.SetModified(name, seconds); }
 
   // Prepares a play info for `name` and says what it loaded.
   std::string LoadedFrom(const std::string& name) {
@@ -109,7 +99,7 @@ class ExportDecision : public ::testing::Test {
     return info.IsCompressed() ? "compressed" : "plain";
   }
 
-  std::string m_dir;
+  TempFolder m_dir;
   RecordingHost m_host;
   std::shared_ptr<ManualClock> m_clock = std::make_shared<ManualClock>();
   std::shared_ptr<FileSequenceLibrary> m_library;

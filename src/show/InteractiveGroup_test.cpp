@@ -1,4 +1,5 @@
 #include "show/InteractiveGroup.h"
+#include "support/testing/Failure.h"
 
 #include <gtest/gtest.h>
 
@@ -32,15 +33,6 @@ const std::string kJukebox =
 
 std::shared_ptr<TriggeredSequences> Binding(int32_t unit, std::vector<std::string> names) {
   return NewTriggeredSequences(NewTrigger(1, unit, 1, ""), names);
-}
-
-int32_t ErrorNumber(const std::function<void()>& action) {
-  try {
-    action();
-  } catch (const Error& e) {
-    return e.Number();
-  }
-  return 0;
 }
 
 TEST(InteractiveGroup, NewGroupHasNoTypeUntilAFlagIsWritten) {
@@ -87,13 +79,13 @@ TEST(InteractiveGroup, BindingsAreIndexedFromZeroAndChecked) {
   auto a = Binding(1, {"a"}), b = Binding(2, {"b"}), c = Binding(3, {"c"});
   for (const auto& binding : {a, b, c}) group.AddTriggeredSequences(binding);
   EXPECT_EQ(group.GetTriggeredSequences(2), c);
-  EXPECT_EQ(ErrorNumber([&] { group.GetTriggeredSequences(3); }), 9);
-  EXPECT_EQ(ErrorNumber([&] { group.GetTriggeredSequences(-1); }), 9);
+  EXPECT_EQ(tav::testing::FailureOf([&] { group.GetTriggeredSequences(3); }).number, 9);
+  EXPECT_EQ(tav::testing::FailureOf([&] { group.GetTriggeredSequences(-1); }).number, 9);
   group.DeleteTriggeredSequence(0);
   EXPECT_EQ(group.Count(), 2);
   EXPECT_EQ(group.GetTriggeredSequences(0), b);
   EXPECT_EQ(group.GetTriggeredSequences(1), c);
-  EXPECT_EQ(ErrorNumber([&] { group.DeleteTriggeredSequence(2); }), 9);
+  EXPECT_EQ(tav::testing::FailureOf([&] { group.DeleteTriggeredSequence(2); }).number, 9);
 }
 
 TEST(InteractiveGroup, CopySharesNothingAndDerivesTheTypeAgain) {

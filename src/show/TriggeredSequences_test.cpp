@@ -1,4 +1,5 @@
 #include "show/TriggeredSequences.h"
+#include "support/testing/Failure.h"
 
 #include <gtest/gtest.h>
 
@@ -11,15 +12,6 @@ namespace {
 
 std::shared_ptr<TriggeredSequences> Abc() {
   return NewTriggeredSequences(NewTrigger(1, 2, 5, "x"), {"a", "b", "c"});
-}
-
-int32_t ErrorNumber(const std::function<void()>& action) {
-  try {
-    action();
-  } catch (const Error& e) {
-    return e.Number();
-  }
-  return 0;
 }
 
 TEST(TriggeredSequences, RoundRobinWrapsAfterTheLastName) {
@@ -38,9 +30,9 @@ TEST(TriggeredSequences, SequenceIndexesAreChecked) {
   auto binding = Abc();
   binding->SetSequence(1, "B");
   EXPECT_EQ(binding->Sequence(1), "B");
-  EXPECT_EQ(ErrorNumber([&] { binding->Sequence(3); }), 9);
-  EXPECT_EQ(ErrorNumber([&] { binding->Sequence(-1); }), 9);
-  EXPECT_EQ(ErrorNumber([&] { binding->SetSequence(3, "d"); }), 9);
+  EXPECT_EQ(tav::testing::FailureOf([&] { binding->Sequence(3); }).number, 9);
+  EXPECT_EQ(tav::testing::FailureOf([&] { binding->Sequence(-1); }).number, 9);
+  EXPECT_EQ(tav::testing::FailureOf([&] { binding->SetSequence(3, "d"); }).number, 9);
 }
 
 TEST(TriggeredSequences, CopySharesNothingAndKeepsItsOwnRoundRobinIndex) {
@@ -58,7 +50,7 @@ TEST(TriggeredSequences, CopySharesNothingAndKeepsItsOwnRoundRobinIndex) {
   EXPECT_EQ(TriggeredSequencesToText(target), "(a,( 5,x, 2, 1),b,c)");
 
   auto noTrigger = NewTriggeredSequences(nullptr, {"a"});
-  EXPECT_EQ(ErrorNumber([&] { target.Copy(noTrigger); }), 91);
+  EXPECT_EQ(tav::testing::FailureOf([&] { target.Copy(noTrigger); }).number, 91);
 }
 
 TEST(TriggeredSequencesText, FirstNameBeforeTheTriggerTheRestAfter) {
@@ -79,13 +71,14 @@ TEST(TriggeredSequencesText, FirstNameBeforeTheTriggerTheRestAfter) {
 TEST(TriggeredSequencesText, UnwritableAndUnreadableBindings) {
   // Sequence(0) is read unconditionally.
   auto noNames = NewTriggeredSequences(NewTrigger(1, 2, 5, "x"), {});
-  EXPECT_EQ(ErrorNumber([&] { TriggeredSequencesToText(noNames); }), 9);
+  EXPECT_EQ(tav::testing::FailureOf([&] { TriggeredSequencesToText(noNames); }).number, 9);
   auto noTrigger = NewTriggeredSequences(nullptr, {"a"});
-  EXPECT_EQ(ErrorNumber([&] { TriggeredSequencesToText(noTrigger); }), 91);
+  EXPECT_EQ(tav::testing::FailureOf([&] { TriggeredSequencesToText(noTrigger); }).number, 91);
 
-  EXPECT_EQ(ErrorNumber([] { TriggeredSequencesFromText("(a)"); }), 9);
-  EXPECT_EQ(ErrorNumber([] { TriggeredSequencesFromText(""); }), 9);
-  EXPECT_EQ(ErrorNumber([] { TriggeredSequencesFromText("(a,( 5,x,two, 1))"); }), 13);
+  EXPECT_EQ(tav::testing::FailureOf([] { TriggeredSequencesFromText("(a)"); }).number, 9);
+  EXPECT_EQ(tav::testing::FailureOf([] { TriggeredSequencesFromText(""); }).number, 9);
+  EXPECT_EQ(tav::testing::FailureOf([] { TriggeredSequencesFromText("(a,( 5,x,two, 1))"); }).number,
+            13);
 }
 
 }  // namespace

@@ -11,6 +11,7 @@
 
 #include "schedule/Schedule.h"
 #include "support/Error.h"
+#include "support/testing/Failure.h"
 
 namespace tav::testing {
 
@@ -87,22 +88,6 @@ inline ::testing::AssertionResult Tiles(const Schedule& schedule) {
     return ::testing::AssertionFailure()
            << "events last " << total << " s, not a week: " << Describe(schedule);
   return ::testing::AssertionSuccess();
-}
-
-struct Failure {
-  int32_t number = 0;
-  std::string source;
-  std::string description;
-};
-
-// The error an action fails with; number 0 when it succeeds.
-inline Failure FailureOf(const std::function<void()>& action) {
-  try {
-    action();
-  } catch (const Error& e) {
-    return {e.Number(), e.Source(), e.Description()};
-  }
-  return {};
 }
 
 }  // namespace tav::testing
