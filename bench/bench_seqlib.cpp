@@ -17,6 +17,7 @@
 #include <string>
 #include <vector>
 
+#include "platform/LocalFileSystem.h"
 #include "suite/seqlib/FileSequenceLibrary.h"
 #include "suite/seqlib/FseqFile.h"
 #include "suite/seqlib/FseqWriter.h"

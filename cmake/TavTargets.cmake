@@ -52,10 +52,10 @@ function(tav_subsystem name)
   if(TAV_TESTS AND test_sources)
     add_executable(${name}_tests ${test_sources})
     target_link_libraries(${name}_tests PRIVATE ${name} ${ARG_TEST_DEPS} GTest::gmock GTest::gtest_main)
-    # Test data written by independent programs lives beside the checkout.
+    # Test data written by independent programs, kept in the repository.
     # Tests read TAV_TESTDATA_DIR from the environment (set here for ctest)
     # or fall back to the compiled-in path when run by hand.
-    set(testdata ${PROJECT_SOURCE_DIR}/../shared/testdata)
+    set(testdata ${PROJECT_SOURCE_DIR}/testdata)
     target_compile_definitions(${name}_tests PRIVATE
       TAV_SOURCE_DIR="${PROJECT_SOURCE_DIR}" TAV_TESTDATA_DIR_DEFAULT="${testdata}")
     gtest_discover_tests(${name}_tests DISCOVERY_TIMEOUT 60

@@ -5,6 +5,7 @@
 set -euo pipefail
 cd "$(dirname "$0")/.."
 bash scripts/install-deps.sh
+bash scripts/check-tree.sh
 cmake --preset dev
 cmake --build build/dev -j "$(nproc)"
 ctest --preset dev -j "$(nproc)" | tee build/dev/ctest.log

@@ -13,6 +13,7 @@
 #include <set>
 
 #include "CommandRegistry.h"
+#include "platform/LocalFileSystem.h"
 #include "platform/PlatformPaths.h"
 #include "platform/SystemClock.h"
 #include "suite/seqlib/CompressedSequence.h"

@@ -22,7 +22,7 @@
 
 #include "config/CallableByName.h"
 #include "config/RegistryStore.h"
-#include "platform/TimerService.h"
+#include "ports/TimerService.h"
 
 namespace tav {
 

@@ -4,7 +4,7 @@
 
 #include "config/LibRegistry.h"
 #include "config/MemoryRegistryStore.h"
-#include "platform/testing/VirtualTimerService.h"
+#include "ports/testing/VirtualTimerService.h"
 
 namespace tav {
 namespace {

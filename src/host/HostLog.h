@@ -13,10 +13,10 @@
 #include <string>
 #include <string_view>
 
-#include "host/HostServices.h"
 #include "host/PendingLog.h"
 #include "host/TrayOutbox.h"
-#include "platform/Clock.h"
+#include "ports/Clock.h"
+#include "ports/MessageLog.h"
 
 namespace tav {
 

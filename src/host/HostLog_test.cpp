@@ -5,8 +5,8 @@
 #include <stdexcept>
 
 #include "host/Msg.h"
-#include "platform/TrayLinkPair.h"
-#include "platform/testing/ManualClock.h"
+#include "host/testing/TrayLinkPair.h"
+#include "ports/testing/ManualClock.h"
 
 namespace tav {
 namespace {

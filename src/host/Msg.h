@@ -12,9 +12,9 @@
 #include <string>
 #include <string_view>
 
-#include "host/HostServices.h"
 #include "host/TAVMessage.h"
-#include "platform/TrayLink.h"
+#include "host/TrayLink.h"
+#include "ports/MessageLog.h"
 #include "support/DateTime.h"
 
 namespace tav {

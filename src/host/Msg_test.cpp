@@ -2,7 +2,7 @@
 
 #include <gtest/gtest.h>
 
-#include "platform/TrayLinkPair.h"
+#include "host/testing/TrayLinkPair.h"
 #include "support/Error.h"
 
 namespace tav {

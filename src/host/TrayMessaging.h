@@ -15,14 +15,14 @@
 #include <memory>
 
 #include "host/HostLog.h"
-#include "host/HostServices.h"
 #include "host/Queue.h"
 #include "host/TAVMessage.h"
 #include "host/TrayHost.h"
+#include "host/TrayLink.h"
 #include "host/TrayOutbox.h"
-#include "platform/Clock.h"
-#include "platform/TimerService.h"
-#include "platform/TrayLink.h"
+#include "ports/Clock.h"
+#include "ports/MessageLog.h"
+#include "ports/TimerService.h"
 #include "schedule/MonitoredShowEvent.h"
 
 namespace tav {

@@ -3,9 +3,9 @@
 #include <gtest/gtest.h>
 
 #include "host/Msg.h"
-#include "platform/TrayLinkPair.h"
-#include "platform/testing/ManualClock.h"
-#include "platform/testing/VirtualTimerService.h"
+#include "host/testing/TrayLinkPair.h"
+#include "ports/testing/ManualClock.h"
+#include "ports/testing/VirtualTimerService.h"
 #include "support/Error.h"
 
 namespace tav {

@@ -9,7 +9,7 @@
 #include <cstdint>
 #include <string_view>
 
-#include "platform/TrayLink.h"
+#include "host/TrayLink.h"
 
 namespace tav {
 

@@ -21,7 +21,7 @@
 #include <string>
 
 #include "platform/EventLoop.h"
-#include "platform/TimerService.h"
+#include "ports/TimerService.h"
 
 namespace tav {
 

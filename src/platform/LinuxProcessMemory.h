@@ -11,7 +11,7 @@
 
 #include <string_view>
 
-#include "platform/ProcessMemory.h"
+#include "ports/ProcessMemory.h"
 
 namespace tav {
 

@@ -36,11 +36,6 @@ Error FileError(int error, const char* source) {
 
 }  // namespace
 
-TextFileStore& DefaultTextFileStore() {
-  static LocalTextFiles files;
-  return files;
-}
-
 std::optional<std::string> LocalTextFiles::ReadText(const std::string& path) {
   constexpr const char* kSource = "LocalTextFiles.ReadText";
   FileDescriptor fd(::open(path.c_str(), O_RDONLY | O_CLOEXEC));

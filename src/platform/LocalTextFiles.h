@@ -13,8 +13,4 @@ class LocalTextFiles : public TextFileStore {
   void WriteText(const std::string& path, std::string_view text) override;
 };
 
-// The local store used by the overloads that take no store. Stateless, so
-// sharing one is harmless; code that needs another store passes it.
-TextFileStore& DefaultTextFileStore();
-
 }  // namespace tav

@@ -9,7 +9,10 @@
 #include <filesystem>
 #include <fstream>
 
+#include "schedule/Schedule.h"
+#include "schedule/YearSchedule.h"
 #include "support/Error.h"
+#include "support/testing/TempFolder.h"
 
 namespace tav {
 namespace {
@@ -18,14 +21,7 @@ namespace fs = std::filesystem;
 
 class LocalTextFilesTest : public ::testing::Test {
  protected:
-  LocalTextFilesTest() {
-    std::string pattern = (fs::temp_directory_path() / "tav-files-XXXXXX").string();
-    m_folder = ::mkdtemp(pattern.data());
-  }
-  ~LocalTextFilesTest() override {
-    fs::permissions(m_folder, fs::perms::owner_all);
-    fs::remove_all(m_folder);
-  }
+  ~LocalTextFilesTest() override { fs::permissions(m_folder, fs::perms::owner_all); }
 
   std::string Path(const std::string& name) const { return (fs::path(m_folder) / name).string(); }
   std::vector<std::string> Entries() const {
@@ -38,7 +34,8 @@ class LocalTextFilesTest : public ::testing::Test {
   }
 
   LocalTextFiles files;
-  std::string m_folder;
+  TempFolder m_temp{"tav-files"};
+  std::string m_folder = m_temp.Path();
 };
 
 TEST_F(LocalTextFilesTest, WritesAndReadsWholeTexts) {
@@ -82,6 +79,18 @@ TEST_F(LocalTextFilesTest, AFailedWriteLeavesThePreviousFileAndNoTemporary) {
   }
   EXPECT_EQ(files.ReadText(Path("weeksched.tsc")), "previous\r\n");
   EXPECT_EQ(Entries(), std::vector<std::string>{"weeksched.tsc"});
+}
+
+TEST_F(LocalTextFilesTest, SchedulesSaveAndLoadThroughTheLocalFiles) {
+  Schedule week;
+  week.AddShowEventByFile("Xmas", NewWeekTime(1, 18, 0, 0), NewWeekTime(1, 22, 0, 0));
+  EXPECT_TRUE(week.Save(Path("weeksched.tsc"), files));
+  EXPECT_FALSE(week.Modified());
+  EXPECT_FALSE(week.Save(Path("no/such/folder/weeksched.tsc"), files));
+  EXPECT_EQ(ScheduleToText(*LoadWeekSchedule(Path("weeksched.tsc"), files)), ScheduleToText(week));
+  EXPECT_TRUE(WriteTextFile(Path("yearsched.tsc"), "", files));
+  EXPECT_TRUE(LoadYearSchedule(Path("yearsched.tsc"), files)->Keys().empty());
+  EXPECT_TRUE(LoadYearSchedule(Path("missing.tsc"), files)->Keys().empty());
 }
 
 }  // namespace

@@ -5,7 +5,7 @@
 // wrapping at 2^32 like the multimedia tick count. Stateless; make one where
 // the program starts and pass it by reference.
 
-#include "platform/Clock.h"
+#include "ports/Clock.h"
 
 namespace tav {
 

@@ -22,7 +22,7 @@
 #include <string>
 #include <string_view>
 
-#include "platform/TrayLink.h"
+#include "host/TrayLink.h"
 
 namespace tav {
 

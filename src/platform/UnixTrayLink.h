@@ -25,8 +25,8 @@
 #include <memory>
 #include <string>
 
+#include "host/TrayLink.h"
 #include "platform/EventLoop.h"
-#include "platform/TrayLink.h"
 
 namespace tav {
 

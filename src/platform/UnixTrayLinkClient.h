@@ -8,7 +8,7 @@
 #include <optional>
 #include <string>
 
-#include "platform/TrayLink.h"
+#include "host/TrayLink.h"
 #include "platform/TrayLinkFrame.h"
 
 namespace tav {

@@ -2,7 +2,6 @@
 
 #include <vector>
 
-#include "platform/LocalTextFiles.h"
 #include "support/Error.h"
 #include "support/Serialize.h"
 
@@ -263,14 +262,6 @@ std::shared_ptr<Schedule> LoadWeekSchedule(const std::string& path, TextFileStor
   auto schedule = text ? ScheduleFromText(*text) : std::make_shared<Schedule>();
   schedule->SetModified(false);
   return schedule;
-}
-
-bool Schedule::Save(const std::string& szFilename) {
-  return Save(szFilename, DefaultTextFileStore());
-}
-
-bool WriteTextFile(const std::string& szFilename, std::string_view text) {
-  return WriteTextFile(szFilename, text, DefaultTextFileStore());
 }
 
 }  // namespace tav

@@ -70,8 +70,6 @@ class Schedule {
   // whatever the result; false when the file could not be written (the old
   // file then stays as it was).
   bool Save(const std::string& szFilename, TextFileStore& files);
-  // On the local file system.
-  bool Save(const std::string& szFilename);
 
   // "BEGIN SCHEDULE DUMP", one line per event, "END SCHEDULE DUMP".
   void DebugDump() const;
@@ -93,7 +91,6 @@ std::string ScheduleToText(const Schedule& schedule);
 std::shared_ptr<Schedule> ScheduleFromText(std::string_view text);
 // Writes the text and one CR LF; false on any failure.
 bool WriteTextFile(const std::string& szFilename, std::string_view text, TextFileStore& files);
-bool WriteTextFile(const std::string& szFilename, std::string_view text);
 // The week schedule file: a new empty schedule when the file does not exist,
 // Modified cleared after loading. Read and format errors are thrown.
 std::shared_ptr<Schedule> LoadWeekSchedule(const std::string& path, TextFileStore& files);

@@ -4,7 +4,6 @@
 #include <cmath>
 #include <cstdio>
 
-#include "platform/LocalTextFiles.h"
 #include "support/Error.h"
 #include "support/Numbers.h"
 #include "support/Serialize.h"
@@ -222,14 +221,6 @@ std::shared_ptr<YearSchedule> LoadYearSchedule(const std::string& path, TextFile
   auto yearSchedule = text ? YearScheduleFromText(*text) : std::make_shared<YearSchedule>();
   yearSchedule->SetModified(false);
   return yearSchedule;
-}
-
-std::shared_ptr<YearSchedule> LoadYearSchedule(const std::string& path) {
-  return LoadYearSchedule(path, DefaultTextFileStore());
-}
-
-bool YearSchedule::Save(const std::string& szFilename) {
-  return Save(szFilename, DefaultTextFileStore());
 }
 
 }  // namespace tav

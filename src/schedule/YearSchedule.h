@@ -56,8 +56,6 @@ class YearSchedule {
 
   // Writes the year schedule file; Modified is cleared whatever the result.
   bool Save(const std::string& szFilename, TextFileStore& files);
-  // On the local file system.
-  bool Save(const std::string& szFilename);
 
  private:
   std::vector<std::string> m_keys;
@@ -74,6 +72,5 @@ std::shared_ptr<YearSchedule> YearScheduleFromText(std::string_view text);
 // exist or cannot be read; Modified cleared after loading. A file that reads
 // but is no year schedule fails with the reader's error.
 std::shared_ptr<YearSchedule> LoadYearSchedule(const std::string& path, TextFileStore& files);
-std::shared_ptr<YearSchedule> LoadYearSchedule(const std::string& path);
 
 }  // namespace tav

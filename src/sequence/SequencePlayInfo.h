@@ -14,8 +14,8 @@
 #include <string>
 #include <vector>
 
-#include "host/HostServices.h"
-#include "platform/ProcessMemory.h"
+#include "ports/ProcessMemory.h"
+#include "sequence/SequenceHost.h"
 #include "suite/channelio/ChannelIO.h"
 #include "suite/seqlib/FileSystem.h"
 #include "suite/seqlib/PathResolver.h"

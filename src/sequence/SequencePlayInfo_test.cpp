@@ -6,14 +6,15 @@
 #include <cstdlib>
 #include <filesystem>
 
-#include "platform/testing/FixedProcessMemory.h"
-#include "platform/testing/ManualClock.h"
+#include "platform/LocalFileSystem.h"
+#include "ports/testing/FixedProcessMemory.h"
+#include "ports/testing/ManualClock.h"
 #include "suite/seqlib/FileSequenceLibrary.h"
 #include "suite/seqlib/PlainSequence.h"
 #include "suite/seqlib/testing/MemorySequenceLibrary.h"
-#include "suite/seqlib/testing/TempFolder.h"
 #include "suite/shellcmd/testing/RecordingShellCommandManager.h"
 #include "support/Error.h"
+#include "support/testing/TempFolder.h"
 
 namespace tav {
 namespace {

@@ -4,18 +4,19 @@
 
 #include <cstdlib>
 
-#include "platform/testing/ManualClock.h"
+#include "platform/LocalFileSystem.h"
+#include "ports/testing/ManualClock.h"
 #include "suite/seqlib/FseqWriter.h"
 #include "suite/seqlib/PlainSequence.h"
 #include "suite/seqlib/SeqErrors.h"
-#include "suite/seqlib/testing/TempFolder.h"
+#include "support/testing/TempFolder.h"
+#include "support/testing/TestData.h"
 
 namespace tav {
 namespace {
 
 std::string TestDataFile(const std::string& name) {
-  const char* dir = std::getenv("TAV_TESTDATA_DIR");
-  return std::string(dir ? dir : "../shared/testdata") + "/fseq/" + name;
+  return testing::TestDataFile("fseq/" + name);
 }
 
 const char* kMain = R"({

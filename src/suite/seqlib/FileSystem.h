@@ -3,7 +3,7 @@
 // modification times, random-access reads, whole-file reads and atomic
 // writes, and directory listings. The library and its users take a
 // FileSystem instead of calling the OS, so tests can inject failures or
-// fake times; LocalFileSystem() is the real one, shared by everybody.
+// fake times; the real one is an adapter (platform/LocalFileSystem.h).
 
 #include <cstdint>
 #include <memory>
@@ -40,7 +40,5 @@ class FileSystem {
   // read.
   virtual std::vector<std::string> ListDirectory(const std::string& path) const = 0;
 };
-
-std::shared_ptr<FileSystem> LocalFileSystem();
 
 }  // namespace tav

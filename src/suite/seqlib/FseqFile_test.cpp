@@ -5,16 +5,17 @@
 #include <cstdlib>
 #include <numeric>
 
+#include "platform/LocalFileSystem.h"
 #include "suite/seqlib/FileSystem.h"
 #include "suite/seqlib/FseqWriter.h"
 #include "suite/seqlib/SeqErrors.h"
+#include "support/testing/TestData.h"
 
 namespace tav {
 namespace {
 
 std::string TestDataFile(const std::string& name) {
-  const char* dir = std::getenv("TAV_TESTDATA_DIR");
-  return std::string(dir ? dir : "../shared/testdata") + "/fseq/" + name;
+  return testing::TestDataFile("fseq/" + name);
 }
 
 std::unique_ptr<FseqFile> OpenBytes(std::string bytes) {

@@ -2,8 +2,9 @@
 
 #include <gtest/gtest.h>
 
+#include "platform/LocalFileSystem.h"
 #include "suite/seqlib/PlaybackFileCreator.h"
-#include "suite/seqlib/testing/TempFolder.h"
+#include "support/testing/TempFolder.h"
 
 namespace tav {
 namespace {

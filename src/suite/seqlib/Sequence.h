@@ -14,7 +14,7 @@
 #include <string>
 #include <vector>
 
-#include "platform/Clock.h"
+#include "ports/Clock.h"
 #include "suite/seqlib/CompiledSequence.h"
 #include "suite/seqlib/EventStream.h"
 #include "suite/seqlib/PlayEvent.h"

@@ -13,7 +13,7 @@
 #include <memory>
 #include <vector>
 
-#include "platform/Clock.h"
+#include "ports/Clock.h"
 #include "suite/seqlib/EventStream.h"
 
 namespace tav {

@@ -4,7 +4,7 @@
 
 #include <gtest/gtest.h>
 
-#include "platform/testing/ManualClock.h"
+#include "ports/testing/ManualClock.h"
 #include "suite/seqlib/Sequence.h"
 #include "suite/seqlib/testing/MemorySequenceLibrary.h"
 #include "support/Error.h"

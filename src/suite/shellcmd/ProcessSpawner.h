@@ -1,7 +1,7 @@
 #pragma once
 // Starting and reaping child processes, the one place the shell-command
-// manager touches the OS. PosixProcessSpawner uses posix_spawn and
-// waitpid(WNOHANG): neither call waits for the child. Tests use a double.
+// manager touches the OS. The real spawner is an adapter
+// (platform/PosixProcessSpawner.h); tests use a double.
 
 #include <cstdint>
 #include <optional>
@@ -17,12 +17,6 @@ class ProcessSpawner {
   virtual int64_t Spawn(const ShellCommand& command) = 0;
   // The exit status once the process has ended (reaping it), else nothing.
   virtual std::optional<int32_t> TryReap(int64_t processId) = 0;
-};
-
-class PosixProcessSpawner : public ProcessSpawner {
- public:
-  int64_t Spawn(const ShellCommand& command) override;
-  std::optional<int32_t> TryReap(int64_t processId) override;
 };
 
 }  // namespace tav

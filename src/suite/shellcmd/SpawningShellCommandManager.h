@@ -7,7 +7,7 @@
 #include <memory>
 #include <vector>
 
-#include "platform/TimerService.h"
+#include "ports/TimerService.h"
 #include "suite/shellcmd/ProcessSpawner.h"
 #include "suite/shellcmd/ShellCommandManager.h"
 

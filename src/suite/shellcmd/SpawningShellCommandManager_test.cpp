@@ -8,7 +8,7 @@
 #include <map>
 #include <thread>
 
-#include "platform/testing/VirtualTimerService.h"
+#include "ports/testing/VirtualTimerService.h"
 #include "support/Error.h"
 
 namespace tav {
@@ -81,47 +81,6 @@ TEST_F(Manager, AFailedStartLeavesNothingRunning) {
   EXPECT_THROW(manager.RunCommand(*manager.PrepareCommand("x")), Error);
   EXPECT_EQ(manager.RunningCount(), 0u);
   EXPECT_TRUE(timers.ArmedTimerNames().empty());
-}
-
-// The real spawner against the real shell: status, environment and folder.
-std::optional<int32_t> WaitFor(PosixProcessSpawner& spawner, int64_t pid) {
-  for (int i = 0; i < 5000; ++i) {
-    if (auto status = spawner.TryReap(pid)) return status;
-    std::this_thread::sleep_for(std::chrono::milliseconds(1));
-  }
-  return std::nullopt;
-}
-
-TEST(PosixProcessSpawner, RunsThroughTheShellWithEnvironmentAndFolder) {
-  PosixProcessSpawner spawner;
-  std::string dir = ::testing::TempDir();
-  ShellCommand command{"echo \"$TAV_SEQUENCE\" > out.txt; pwd >> out.txt; exit 3",
-                       dir,
-                       {{"TAV_SEQUENCE", "carol.tseq"}}};
-  int64_t pid = spawner.Spawn(command);
-  EXPECT_EQ(WaitFor(spawner, pid), 3);
-  std::ifstream out(dir + "/out.txt");
-  std::string line1, line2;
-  std::getline(out, line1);
-  std::getline(out, line2);
-  EXPECT_EQ(line1, "carol.tseq");
-  EXPECT_NE(line2.find(dir.substr(0, dir.size() - 1)), std::string::npos);
-}
-
-TEST(PosixProcessSpawner, ReportsTheSignalThatEndedAProcess) {
-  PosixProcessSpawner spawner;
-  int64_t pid = spawner.Spawn({"kill -TERM $$", "", {}});
-  EXPECT_EQ(WaitFor(spawner, pid), 128 + 15);
-}
-
-TEST(PosixProcessSpawner, AMissingFolderIsReportedByTheShellNotByACrash) {
-  PosixProcessSpawner spawner;
-  try {
-    int64_t pid = spawner.Spawn({"true", "/nonexistent/folder", {}});
-    EXPECT_NE(WaitFor(spawner, pid), 0);
-  } catch (const Error& e) {
-    EXPECT_NE(e.Description().find("Cannot start"), std::string::npos);
-  }
 }
 
 }  // namespace

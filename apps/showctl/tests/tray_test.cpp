@@ -19,7 +19,7 @@
 #include "platform/TrayLinkFrame.h"
 #include "platform/UnixTrayLink.h"
 #include "platform/UnixTrayLinkClient.h"
-#include "platform/testing/ManualClock.h"
+#include "ports/testing/ManualClock.h"
 
 extern char** environ;
 

@@ -8,9 +8,7 @@
 #include <cerrno>
 #include <cstring>
 
-#include "platform/PosixFiles.h"
-#include "suite/seqlib/FileSystem.h"
-
+#include "platform/LocalFileSystem.h"
 #include "platform/PosixFiles.h"
 #include "suite/seqlib/SeqErrors.h"
 

@@ -1,4 +1,4 @@
-#include "platform/testing/VirtualTimerService.h"
+#include "ports/testing/VirtualTimerService.h"
 
 #include <algorithm>
 #include <map>

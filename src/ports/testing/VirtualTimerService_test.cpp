@@ -1,11 +1,11 @@
-#include "platform/testing/VirtualTimerService.h"
+#include "ports/testing/VirtualTimerService.h"
 
 #include <gtest/gtest.h>
 
 #include <stdexcept>
 
-#include "platform/testing/FixedProcessMemory.h"
-#include "platform/testing/ManualClock.h"
+#include "ports/testing/FixedProcessMemory.h"
+#include "ports/testing/ManualClock.h"
 
 namespace tav {
 namespace {

@@ -9,7 +9,7 @@
 #include <string>
 #include <vector>
 
-#include "suite/shellcmd/ProcessSpawner.h"
+#include "platform/PosixProcessSpawner.h"
 #include "support/Error.h"
 
 extern char** environ;

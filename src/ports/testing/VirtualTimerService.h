@@ -17,7 +17,7 @@
 #include <string>
 #include <vector>
 
-#include "platform/TimerService.h"
+#include "ports/TimerService.h"
 
 namespace tav {
 

@@ -9,7 +9,7 @@
 #include <optional>
 #include <vector>
 
-#include "platform/ProcessMemory.h"
+#include "ports/ProcessMemory.h"
 
 namespace tav {
 

@@ -1,4 +1,4 @@
-#include "platform/TrayLinkPair.h"
+#include "host/testing/TrayLinkPair.h"
 
 namespace tav {
 

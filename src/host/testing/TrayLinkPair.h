@@ -11,7 +11,7 @@
 #include <string>
 #include <vector>
 
-#include "platform/TrayLink.h"
+#include "host/TrayLink.h"
 
 namespace tav {
 

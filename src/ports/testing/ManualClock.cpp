@@ -1,4 +1,4 @@
-#include "platform/testing/ManualClock.h"
+#include "ports/testing/ManualClock.h"
 
 namespace tav {
 

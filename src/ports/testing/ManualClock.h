@@ -16,8 +16,8 @@
 #include <cstdint>
 #include <functional>
 
-#include "platform/Clock.h"
-#include "platform/testing/VirtualTimerService.h"
+#include "ports/Clock.h"
+#include "ports/testing/VirtualTimerService.h"
 
 namespace tav {
 
