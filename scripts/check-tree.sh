@@ -35,7 +35,7 @@ done
 # 4. Sources are clang-format clean (.clang-format), when the tool is here.
 if command -v clang-format >/dev/null 2>&1; then
   unformatted=$(git ls-files -z --cached --others --exclude-standard -- '*.h' '*.cpp' |
-                xargs -0 clang-format --dry-run 2>&1 | grep -o '^[^:]*:[0-9]*' | cut -d: -f1 | sort -u || true)
+                xargs -0 clang-format --dry-run 2>&1 | grep -oE '^[^ :]+:[0-9]+:[0-9]+: warning' | cut -d: -f1 | sort -u || true)
   if [ -n "$unformatted" ]; then
     echo "check-tree: not clang-format clean (run clang-format -i on them):"
     echo "$unformatted"

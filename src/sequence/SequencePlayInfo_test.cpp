@@ -9,6 +9,7 @@
 #include "platform/LocalFileSystem.h"
 #include "ports/testing/FixedProcessMemory.h"
 #include "ports/testing/ManualClock.h"
+#include "suite/channelio/testing/RecordingChannelIO.h"
 #include "suite/seqlib/FileSequenceLibrary.h"
 #include "suite/seqlib/PlainSequence.h"
 #include "suite/seqlib/testing/MemorySequenceLibrary.h"
@@ -41,12 +42,6 @@ class RecordingHost : public SequenceHost {
 
   std::vector<std::string> lines, starts, stops, asked;
   std::optional<std::string> playbackFile;
-};
-
-class CountingCIO : public ChannelIO {
- public:
-  void KeepAlive() override { ++keepAlives; }
-  int keepAlives = 0;
 };
 
 SequenceData TwoChannels(const std::string& media = "") {
@@ -373,11 +368,11 @@ TEST_F(PlayInfo, FootprintIsTheGrowthAcrossThePlainLoad) {
 }
 
 TEST_F(PlayInfo, KeepAliveReachesTheChannelIOWhileLoading) {
-  auto cio = std::make_shared<CountingCIO>();
+  auto cio = std::make_shared<RecordingChannelIO>();
   auto info = Make("a.json", 4);
   info->SetCIO(cio);
   info->InitializeForPlay();
-  EXPECT_GE(cio->keepAlives, 1);
+  EXPECT_GE(cio->CountOf("KeepAlive"), 1u);
 }
 
 TEST_F(PlayInfo, LoadFailureSetsTheErrorText) {
