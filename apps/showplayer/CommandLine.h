@@ -1,0 +1,30 @@
+#pragma once
+// What the player's command line asks for. The player's own options
+// (--help, --version, --view) are taken out wherever they stand; everything
+// else, joined with single blanks, is the command line the host compares
+// exactly with "/noschedule" (so "/noschedule " in quotes, "/NOSCHEDULE" or
+// "/noschedule x" leave the schedules on). Paths never come from here: they
+// come from the environment.
+
+#include <string>
+#include <vector>
+
+namespace tav::player {
+
+struct PlayerCommandLine {
+  bool help = false;
+  bool version = false;
+  // --view or --view=SPEC: draw the levels in the terminal.
+  bool view = false;
+  std::string viewSpec;
+  // What is left for the host.
+  std::string commandLine;
+};
+
+// `args` without the program name.
+PlayerCommandLine ParsePlayerCommandLine(const std::vector<std::string>& args);
+
+// The text of --help.
+std::string PlayerHelpText();
+
+}  // namespace tav::player
