@@ -200,7 +200,9 @@ def chase_frames(seconds=20.0):
 
 def bells_frames(strikes):
     """The house during the peal: each bell lights its own universe (13-16),
-    bright at the strike and dying away as the sound does."""
+    bright at the strike and dying away as the sound does. Slots 511 and 512
+    of universe 13 carry the frame number (high byte, low byte): a time code
+    by which a measurement can tell which frame of the music is on show."""
     count = int(BELLS_SECONDS * 1000 / FPS_STEP_MS)
     frames = []
     for n in range(count):
@@ -213,6 +215,8 @@ def bells_frames(strikes):
         for lamp in range(4):
             value = int(255 * levels[lamp])
             frame[lamp * SLOTS:lamp * SLOTS + 384] = bytes([value]) * 384
+        frame[510] = n >> 8
+        frame[511] = n & 0xFF
         frames.append(bytes(frame))
     return frames
 
