@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <cctype>
+#include <cstdlib>
 
 #include "CommandRegistry.h"
 #include "config/MemoryRegistryStore.h"
@@ -46,6 +47,18 @@ std::vector<std::string> NewLines(std::vector<std::string> before, std::vector<s
   return added;
 }
 
+// "DMX universe entry 3 size ..." names the list position; people know
+// their universes by number: "DMX universe 20 size ...".
+std::string ByUniverseNumber(const NetworkPreferences& prefs, const std::string& line) {
+  static const std::string kPrefix = "DMX universe entry ";
+  if (line.rfind(kPrefix, 0) != 0) return line;
+  size_t end = line.find(' ', kPrefix.size());
+  int32_t entry = std::atoi(line.substr(kPrefix.size(), end - kPrefix.size()).c_str());
+  if (entry < 1 || entry > prefs.DMXUniverseCount() || end == std::string::npos) return line;
+  return fmt::format("DMX universe {}{}", prefs.DMXUniverse(entry - 1).Universe(),
+                     line.substr(end));
+}
+
 std::string Joined(const std::vector<std::string>& lines) {
   std::string text;
   for (const auto& line : lines) text += (text.empty() ? "" : "; ") + line;
@@ -57,7 +70,8 @@ std::string Joined(const std::vector<std::string>& lines) {
 std::vector<std::string> OutOfRange(const NetworkPreferences& prefs) {
   NetworkPreferences checked = prefs;
   checked.Listener().SetEnabled(true);
-  std::vector<std::string> lines = checked.Validate();
+  std::vector<std::string> lines;
+  for (const auto& line : checked.Validate()) lines.push_back(ByUniverseNumber(prefs, line));
   if (prefs.SourceName().size() > kMaxSourceNameBytes) {
     lines.push_back(fmt::format("source name is {} bytes long, longer than {}",
                                 prefs.SourceName().size(), kMaxSourceNameBytes));

@@ -23,7 +23,8 @@ namespace tav::showctl {
 // NetworkPreferences::Validate reports (with the DMX listener's values
 // checked even while it is switched off, since switching it on must not
 // fail later), and the E1.31 source name length, the source CID's form and
-// the listener's transport, which it does not check.
+// the listener's transport, which it does not check. DMX universes are named
+// by their number rather than their place in the list.
 std::vector<std::string> OutOfRange(const NetworkPreferences& prefs);
 
 struct NetworkEditResult {
