@@ -85,6 +85,23 @@ TEST_F(NetworkCommand, AChangeIsSavedWhereThePlayerReadsItAndAnnouncedWithANewVe
   EXPECT_EQ(Run({"settings", "get", "MonitorRestart", "-s", "MonitorMemory"}).out, "false\n");
 }
 
+TEST_F(NetworkCommand, ChangesMadeAtTheSameTimeAreAllKept) {
+  std::vector<std::vector<std::string>> commands;
+  for (int network = 0; network < 6; ++network) {
+    commands.push_back({"network", "tav", std::to_string(network), "--speed",
+                        std::to_string(9600 * (network + 1))});
+  }
+  commands.push_back({"network", "universe", "add", "1-4"});
+  commands.push_back({"network", "output", "--ttl", "9"});
+  ASSERT_TRUE(RunAtOnce(commands));
+  NetworkPreferences prefs = Stored();
+  for (int network = 0; network < 6; ++network) {
+    EXPECT_EQ(prefs.TAVNetwork(network).Speed(), 9600 * (network + 1)) << network;
+  }
+  EXPECT_EQ(prefs.DMXUniverseCount(), 4);
+  EXPECT_EQ(prefs.MulticastTTL(), 9);
+}
+
 TEST_F(NetworkCommand, ShowingOrRepeatingAValueWritesNothing) {
   EXPECT_EQ(Run({"network", "tav", "0"}).exitCode, 0);
   EXPECT_EQ(Run({"network", "list"}).exitCode, 0);
