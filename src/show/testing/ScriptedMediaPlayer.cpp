@@ -68,9 +68,11 @@ void ScriptedMediaPlayer::OpenMedia(const std::string& path) {
   uint64_t generation = ++m_generation;
   Record("OpenMedia(" + m_file + ")");
   if (!m_script.loadErrors.empty()) {
-    m_endMs = 1;
-    Post(1, [this, generation] {
+    m_endMs = UINT32_MAX;
+    m_loadFailed = false;
+    Post(0, [this, generation] {
       if (generation != m_generation) return;
+      m_loadFailed = true;
       m_errors.insert(m_errors.end(), m_script.loadErrors.begin(), m_script.loadErrors.end());
       Record("event MediaError");
       if (m_onMediaError) m_onMediaError();
@@ -123,8 +125,8 @@ double ScriptedMediaPlayer::CurrentPosition() const {
 
 int32_t ScriptedMediaPlayer::PlayState() const {
   if (m_file.empty() || m_stopped) return kMediaStopped;
-  if (ElapsedMs() >= m_endMs) return kMediaStopped;
-  return m_script.loadErrors.empty() ? kMediaPlaying : kMediaTransitioning;
+  if (!m_script.loadErrors.empty()) return m_loadFailed ? kMediaStopped : kMediaTransitioning;
+  return ElapsedMs() >= m_endMs ? kMediaStopped : kMediaPlaying;
 }
 
 void ScriptedMediaPlayer::SetFullScreen(bool value) {

@@ -7,8 +7,8 @@
 // through a timer of the service, as the real player's would:
 //  - a file that plays: PlayStateChange(3) at once;
 //  - at its end, or when it stops early: PlayStateChange(8), then (1);
-//  - a file that cannot be played: the transitional state (9) for one
-//    millisecond, then MediaError and PlayStateChange(1);
+//  - a file that cannot be played: the transitional state (9) until, on the
+//    loop at once, MediaError and PlayStateChange(1) arrive;
 //  - Stop(): PlayStateChange(1).
 // Its calls and events go to a Timeline as "media ..." lines.
 
@@ -93,6 +93,7 @@ class ScriptedMediaPlayer : public MediaPlayer {
   uint32_t m_openedAt = 0;
   uint32_t m_endMs = 0;       // where it stops by itself
   bool m_stopped = true;      // by Stop(), or nothing opened
+  bool m_loadFailed = false;  // the failure of a file that cannot play has been raised
   uint64_t m_generation = 0;  // events of an earlier file are dropped
 
   std::vector<std::string> m_errors;
