@@ -8,6 +8,7 @@
 #include <memory>
 #include <string>
 
+#include "config/NetworkPreferences.h"
 #include "config/RegistryStore.h"
 #include "config/Settings.h"
 #include "host/TrayLink.h"
@@ -48,6 +49,10 @@ struct HostServices {
   std::function<void(const std::string& text)> messageBox;
   // Called once, when the form has unloaded: the program ends.
   std::function<void()> onUnloaded;
+  // Called with the engine's network preferences once it has applied them
+  // (at load, and after each change announced in the registry), so that
+  // the composition root can place FSEQ channels on the new universes.
+  std::function<void(const NetworkPreferences&)> networkPreferencesApplied;
 };
 
 }  // namespace tav

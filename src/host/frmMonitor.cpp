@@ -190,6 +190,9 @@ void frmMonitor::CreateShowPlayer() {
   services.shellCommands = m_services.shellCommands.get();
   m_showPlayer = std::make_unique<ShowPlayer>(std::move(services));
   m_showPlayer->InitControls(*this, *m_tmrShowPlayer, m_CIO, m_services.media);
+  if (m_services.networkPreferencesApplied) {
+    m_services.networkPreferencesApplied(m_showPlayer->NetworkSettings());
+  }
 }
 
 void frmMonitor::ReadVisualizerSettings() {
@@ -276,7 +279,11 @@ void frmMonitor::SimulateInput(int32_t network, int32_t unitId, int32_t inputNum
 }
 
 void frmMonitor::DoUpdateNetworkPrefsFromRegistry() {
-  if (m_showPlayer) m_showPlayer->ShowPlayerUpdateNetworkPrefsFromRegistry();
+  if (!m_showPlayer) return;
+  m_showPlayer->ShowPlayerUpdateNetworkPrefsFromRegistry();
+  if (m_services.networkPreferencesApplied) {
+    m_services.networkPreferencesApplied(m_showPlayer->NetworkSettings());
+  }
 }
 
 std::string frmMonitor::CreatePlaybackFileIfNeeded(const std::string& szFilename) {
