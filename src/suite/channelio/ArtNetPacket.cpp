@@ -33,7 +33,7 @@ void EncodeArtDmx(uint8_t sequence, uint8_t physical, uint16_t portAddress, cons
   out[15] = static_cast<uint8_t>(portAddress >> 8 & 0x7F);  // Net
   out[16] = static_cast<uint8_t>(length >> 8);
   out[17] = static_cast<uint8_t>(length);
-  if (slots) std::memcpy(out + kArtDmxDataOffset, slots, slotCount);
+  if (slots && slotCount > 0) std::memcpy(out + kArtDmxDataOffset, slots, slotCount);
   std::memset(out + kArtDmxDataOffset + slotCount, 0, length - slotCount);
 }
 

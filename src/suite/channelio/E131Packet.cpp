@@ -62,8 +62,8 @@ void EncodeE131Data(const E131DataFields& fields, const uint8_t* slots, size_t s
   PutFlagsAndLength(out + 38, size - 38);
   Put32(out + 40, kFramingVectorData);
   std::memset(out + 44, 0, kE131SourceNameSize);
-  std::memcpy(out + 44, fields.sourceName.data(),
-              std::min(fields.sourceName.size(), kE131SourceNameSize - 1));
+  size_t nameSize = std::min(fields.sourceName.size(), kE131SourceNameSize - 1);
+  if (nameSize > 0) std::memcpy(out + 44, fields.sourceName.data(), nameSize);
   out[kE131PriorityOffset] = fields.priority;
   Put16(out + 109, fields.syncAddress);
   out[kE131SequenceOffset] = fields.sequence;
@@ -77,7 +77,7 @@ void EncodeE131Data(const E131DataFields& fields, const uint8_t* slots, size_t s
   Put16(out + 121, 0x0001);  // address increment
   Put16(out + 123, static_cast<uint16_t>(slotCount + 1));
   out[125] = 0x00;  // START code: levels
-  if (slots) std::memcpy(out + kE131SlotsOffset, slots, slotCount);
+  if (slots && slotCount > 0) std::memcpy(out + kE131SlotsOffset, slots, slotCount);
 }
 
 void EncodeE131Sync(const Cid& cid, uint8_t sequence, uint16_t syncAddress, uint8_t* out) {

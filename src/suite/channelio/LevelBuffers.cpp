@@ -28,6 +28,7 @@ void LevelBuffers::WriteDMX(int32_t universe, int32_t firstSlot, const uint8_t* 
   count = std::min(count, kDMXSlots - firstSlot + 1);
   DMXLevels* buffer = Universe(universe);
   if (!buffer) return;
+  buffer->written = true;
   uint8_t* target = buffer->slots.data() + (firstSlot - 1);
   if (std::memcmp(target, levels, static_cast<size_t>(count)) == 0) return;
   std::memcpy(target, levels, static_cast<size_t>(count));

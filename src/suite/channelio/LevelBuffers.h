@@ -34,6 +34,7 @@ inline constexpr int32_t kMaxFennickChannels = 4096;
 struct DMXLevels {
   std::array<uint8_t, kDMXSlots> slots{};
   uint64_t version = 0;
+  bool written = false;  // by anything, even the levels it already had
 };
 
 struct ChannelLevels {

@@ -115,7 +115,7 @@ void UdpDMXOutput::Send(const OutputFrame& frame) {
   bool changedAny = false;
   for (Stream& s : m_streams) {
     // A universe is sourced from its first frame on.
-    if (!s.levels || (!s.started && s.levels->version == 0)) continue;
+    if (!s.levels || (!s.started && !s.levels->written)) continue;
     bool changed = !s.started || s.sentDark != frame.dark ||
                    (!frame.dark && s.levels->version != s.sentVersion);
     bool keepAlive =
