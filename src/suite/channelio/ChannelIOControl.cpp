@@ -80,6 +80,11 @@ void ChannelIOControl::SetupClient(bool boolExclusive, const std::string& szClie
 }
 
 void ChannelIOControl::ReleaseClient() {
+  // What was sealed goes out now, a little early, rather than never.
+  if (m_setUp && m_queue.NextSealedDue()) {
+    m_queue.TakeAllSealed(m_due);
+    Service();
+  }
   m_ports.timer->Cancel();
   m_receiver.reset();
   m_listener.reset();
@@ -451,7 +456,13 @@ void ChannelIOControl::OnDatagrams(std::span<const ReceivedDatagram> datagrams) 
 
 uint32_t ChannelIOControl::Due(uint32_t dueTick) const {
   uint32_t now = m_ports.clock->TickCount();
-  return TickDistance(now, dueTick) > kMaxLeadMs ? now : dueTick;
+  if (TickDistance(now, dueTick) > kMaxLeadMs) dueTick = now;
+  // A write never lands in a frame before one already accumulated, so a
+  // later write always wins: lights-off events of a stopped sequence come
+  // due "now" while its next frame may already wait a few milliseconds on.
+  std::optional<uint32_t> last = m_queue.LastDue();
+  if (last && TickBefore(dueTick, *last)) dueTick = *last;
+  return dueTick;
 }
 
 void ChannelIOControl::OutputEffect(int32_t devType, int32_t lNetwork, uint8_t byteUnit,
@@ -531,7 +542,7 @@ void ChannelIOControl::MapTAVOntoDMX() {
 
 void ChannelIOControl::Service() {
   uint32_t now = m_ports.clock->TickCount();
-  m_queue.TakeDue(now, m_due);
+  m_queue.TakeDue(now, m_due);  // after any frames a release put there
   bool newFrame = !m_due.empty();
   uint32_t frameTick = now;
   if (newFrame) {

@@ -169,18 +169,31 @@ TEST_F(Control, FramesThatFellDueTogetherLeaveAsOneWithTheNewestLevels) {
   EXPECT_EQ(control.Statistics().frames, 1u);
 }
 
-TEST_F(Control, WritesOfOneTickFormOneFrameWhateverTheOrderTheyCame) {
+TEST_F(Control, AWriteComingAfterALaterFrameJoinsItSoTheLaterWriteWins) {
   Start();
-  Levels(1, 30, 1050);
-  Levels(1, 10, 1025);
-  control.SendAccumulated(1050);
+  Levels(1, 30, 1030);
+  control.SendAccumulated(1030);
+  Levels(1, 0, 1025);  // lights-off of a sequence stopped at 1025
+  Levels(2, 5, 1025);
+  control.SendAccumulated(1025);
   timer.RunUntil(1100);
-  auto data = DataOf(1);
+  auto data = Data();
   ASSERT_EQ(data.size(), 2u);
-  EXPECT_EQ(data[0].tick, 1025u);
-  EXPECT_EQ(data[0].Slot(1), 10);
-  EXPECT_EQ(data[1].tick, 1050u);
-  EXPECT_EQ(data[1].Slot(1), 30);
+  EXPECT_EQ(data[0].tick, 1030u);
+  EXPECT_EQ(data[0].Slot(1), 0);
+  EXPECT_EQ(data[1].view.universe, 2);
+}
+
+TEST_F(Control, ReleaseSendsWhatWasSealedFirst) {
+  Start();
+  Levels(1, 30, 1020);
+  control.SendAccumulated(1020);
+  control.ReleaseClient();
+  auto data = DataOf(1);
+  ASSERT_EQ(data.size(), 4u);
+  EXPECT_EQ(data[0].Slot(1), 30);
+  EXPECT_EQ(data[0].view.options, 0);
+  EXPECT_EQ(data[3].view.options, kE131OptionTerminated);
 }
 
 TEST_F(Control, UnchangedUniversesWaitForTheirKeepAlive) {

@@ -65,6 +65,18 @@ void FrameQueue::TakeDue(uint32_t now, std::vector<Frame>& due) {
   }
 }
 
+void FrameQueue::TakeAllSealed(std::vector<Frame>& due) {
+  while (!m_frames.empty() && m_frames.front().sealed) {
+    due.push_back(std::move(m_frames.front()));
+    m_frames.pop_front();
+  }
+}
+
+std::optional<uint32_t> FrameQueue::LastDue() const {
+  if (m_frames.empty()) return std::nullopt;
+  return m_frames.back().dueTick;
+}
+
 void FrameQueue::Recycle(std::vector<Frame>& frames) {
   for (Frame& frame : frames) {
     frame.writes.clear();

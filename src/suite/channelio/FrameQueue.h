@@ -54,6 +54,10 @@ class FrameQueue {
   // (a frame still open stops the taking: it may not overtake). Hand them
   // back with Recycle once applied.
   void TakeDue(uint32_t now, std::vector<Frame>& due);
+  // Every sealed frame, however far ahead (the control is closing).
+  void TakeAllSealed(std::vector<Frame>& due);
+  // The due tick of the latest frame held, sealed or not.
+  std::optional<uint32_t> LastDue() const;
   void Recycle(std::vector<Frame>& frames);
   bool Empty() const { return m_frames.empty(); }
   size_t Size() const { return m_frames.size(); }

@@ -106,6 +106,9 @@ void Sequence::SyncToMusic(int32_t positionMs) {
 bool Sequence::GetEvent(PlayEvent& event) {
   return m_player ? m_player->GetEvent(event) : false;
 }
+int64_t Sequence::NextEventIn() {
+  return m_player ? m_player->NextEventIn() : -1;
+}
 int64_t Sequence::Position() const {
   return m_player ? m_player->Position() : 0;
 }

@@ -89,6 +89,8 @@ class Sequence {
   void InitMusicSync(int32_t positionMs);
   void SyncToMusic(int32_t positionMs);
   bool GetEvent(PlayEvent& event);
+  // See SequencePlayer::NextEventIn; -1 before a load.
+  int64_t NextEventIn();
   int64_t Position() const;
 
   // Completes a command the shell-command manager prepared: it runs in the
