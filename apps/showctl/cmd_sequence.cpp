@@ -167,8 +167,7 @@ void Convert(const SequenceOptions& o) {
 static CommandGroup reg{
     "sequence", [](CLI::App& app) {
       auto options = std::make_shared<SequenceOptions>();
-      auto* group = app.add_subcommand("sequence",
-                                       "Inspect, convert and play sequence files");
+      auto* group = app.add_subcommand("sequence", "Inspect, convert and play sequence files");
       group->require_subcommand(1);
       group->add_option(
           "--folder", options->folder,

@@ -53,8 +53,11 @@ class StderrLog : public MessageLog {
   explicit StderrLog(bool quiet) : m_quiet(quiet) {}
   void LogMessage(int32_t level, const std::string& text, const SequenceIdentity*) override {
     if (level <= 0 || (m_quiet && level < 2)) return;
-    std::cerr << "showctl: " << (level >= 3 ? "error: " : level == 2 ? "warning: " : "") << text
-              << "\n";
+    std::cerr << "showctl: "
+              << (level >= 3   ? "error: "
+                  : level == 2 ? "warning: "
+                               : "")
+              << text << "\n";
   }
 
  private:
@@ -70,8 +73,8 @@ int TerminalWidth() {
 void Dispatch(ChannelIO& control, const PlayEvent& e) {
   if (e.playEventType == kPlayEventEffect) {
     control.OutputEffect(e.devType, e.lNetwork, e.byteUnit, e.lCircuit, e.szChannelName,
-                         e.effectType, e.lDuration, e.lStartIntensity, e.lEndIntensity,
-                         e.lPriority, e.dueTick);
+                         e.effectType, e.lDuration, e.lStartIntensity, e.lEndIntensity, e.lPriority,
+                         e.dueTick);
   } else if (e.playEventType == kPlayEventLevels && e.devType == kFamilyDMX) {
     control.OutputDMXLevels(e.lNetwork, e.nIntensityBlobStartAddress, e.nIntensityBlobCount,
                             e.byteIntensityBlob.data(), e.dueTick);
@@ -82,9 +85,9 @@ void Dispatch(ChannelIO& control, const PlayEvent& e) {
 }
 
 std::string Summary(const ChannelIOStatistics& s, double seconds) {
-  return fmt::format(
-      "{:.1f} s, {} frames, {} late (worst {} ms), {} packets sent, {} dropped", seconds,
-      s.frames, s.framesLate, s.maxLatenessMs, s.packetsSent, s.packetsDropped);
+  return fmt::format("{:.1f} s, {} frames, {} late (worst {} ms), {} packets sent, {} dropped",
+                     seconds, s.frames, s.framesLate, s.maxLatenessMs, s.packetsSent,
+                     s.packetsDropped);
 }
 
 int Play(const PlayOptions& o, const std::string& folder) {
@@ -162,14 +165,15 @@ int Play(const PlayOptions& o, const std::string& folder) {
     options.unicode = !o.ascii;
     options.compact = o.compact;
     std::fputs("\x1b[2J", stdout);
-    view = std::make_unique<LevelViewDriver>(
-        control.Levels(), selection, options, 200, [](const std::vector<std::string>& lines) {
-          std::string screen = "\x1b[H";
-          for (const auto& line : lines) screen += line + "\x1b[K\n";
-          screen += "\x1b[J";
-          std::fwrite(screen.data(), 1, screen.size(), stdout);
-          std::fflush(stdout);
-        });
+    view = std::make_unique<LevelViewDriver>(control.Levels(), selection, options, 200,
+                                             [](const std::vector<std::string>& lines) {
+                                               std::string screen = "\x1b[H";
+                                               for (const auto& line : lines)
+                                                 screen += line + "\x1b[K\n";
+                                               screen += "\x1b[J";
+                                               std::fwrite(screen.data(), 1, screen.size(), stdout);
+                                               std::fflush(stdout);
+                                             });
     control.SetOnFrameSent([&](uint32_t tick) {
       view->OnFrame(tick, o.file + "  " + Summary(control.Statistics(), elapsed()));
     });
@@ -226,7 +230,8 @@ int Play(const PlayOptions& o, const std::string& folder) {
   control.ReleaseClient();
   ChannelIOStatistics stats = control.Statistics();
   if (view) view->DrawNow(o.file + "  " + Summary(stats, elapsed()));
-  if (!o.quiet) std::cerr << "showctl: played " << o.file << ": " << Summary(stats, elapsed()) << "\n";
+  if (!o.quiet)
+    std::cerr << "showctl: played " << o.file << ": " << Summary(stats, elapsed()) << "\n";
   return 0;
 }
 

@@ -543,36 +543,43 @@ void ChannelIOControl::MapTAVOntoDMX() {
 void ChannelIOControl::Service() {
   uint32_t now = m_ports.clock->TickCount();
   m_queue.TakeDue(now, m_due);  // after any frames a release put there
-  bool newFrame = !m_due.empty();
-  uint32_t frameTick = now;
-  if (newFrame) {
-    frameTick = m_due.back().dueTick;
-    for (const Frame& frame : m_due) ApplyFrame(frame);
+  if (!m_due.empty()) {
+    // Frames that fell due together leave one after the other, in order,
+    // so a late frame is never lost nor held behind a newer one.
+    for (const Frame& frame : m_due) {
+      ApplyFrame(frame);
+      SendFrame(frame.dueTick, now);
+    }
     m_queue.Recycle(m_due);
   } else if (m_refreshDue && !TickBefore(now, *m_refreshDue)) {
-    newFrame = true;
-    frameTick = *m_refreshDue;
+    SendFrame(*m_refreshDue, now);
+  } else {
+    SendToOutputs(now, false);
   }
-  if (newFrame) {
-    m_effects.Render(frameTick, m_levels);
-    MapTAVOntoDMX();
-    m_refreshDue.reset();
-    if (m_effects.Active()) m_refreshDue = frameTick + m_refreshMs;
-    ++m_stats.frames;
-    uint32_t lateness = static_cast<uint32_t>(std::max(TickDistance(frameTick, now), 0));
-    if (lateness >= kLateMs) ++m_stats.framesLate;
-    m_stats.maxLatenessMs = std::max(m_stats.maxLatenessMs, lateness);
-  }
-  if (m_setUp) {
-    OutputFrame frame{m_levels, now, newFrame, !m_lightsActive};
-    for (auto& [key, output] : m_udp) output->Send(frame);
-    for (auto& [index, output] : m_widgets) output->Send(frame);
-    for (auto& [index, output] : m_tavSerial) output->Send(frame);
-    if (m_x10) m_x10->Send(frame);
-    if (m_fennick) m_fennick->Send(frame);
-  }
-  if (newFrame && m_onFrameSent) m_onFrameSent(frameTick);
   Arm();
+}
+
+void ChannelIOControl::SendFrame(uint32_t frameTick, uint32_t now) {
+  m_effects.Render(frameTick, m_levels);
+  MapTAVOntoDMX();
+  m_refreshDue.reset();
+  if (m_effects.Active()) m_refreshDue = frameTick + m_refreshMs;
+  ++m_stats.frames;
+  uint32_t lateness = static_cast<uint32_t>(std::max(TickDistance(frameTick, now), 0));
+  if (lateness >= kLateMs) ++m_stats.framesLate;
+  m_stats.maxLatenessMs = std::max(m_stats.maxLatenessMs, lateness);
+  SendToOutputs(now, true);
+  if (m_onFrameSent) m_onFrameSent(frameTick);
+}
+
+void ChannelIOControl::SendToOutputs(uint32_t now, bool newFrame) {
+  if (!m_setUp) return;
+  OutputFrame frame{m_levels, now, newFrame, !m_lightsActive};
+  for (auto& [key, output] : m_udp) output->Send(frame);
+  for (auto& [index, output] : m_widgets) output->Send(frame);
+  for (auto& [index, output] : m_tavSerial) output->Send(frame);
+  if (m_x10) m_x10->Send(frame);
+  if (m_fennick) m_fennick->Send(frame);
 }
 
 void ChannelIOControl::Arm() {

@@ -11,8 +11,8 @@
 // ms after the last frame) and the outputs' keep-alives. A frame is sent at
 // its due tick, not when the engine noticed it; a frame sealed after its
 // tick has passed is sent at once and counted late, and frames that fell
-// due together are sent as one (the newest levels), never one behind the
-// other.
+// due together (the loop was busy) leave at once one after the other, in
+// order, so none is lost.
 //
 // Nothing is transmitted before SetupClient or after ReleaseClient; the
 // levels are kept all the same, so the terminal view shows them. TAV
@@ -140,6 +140,9 @@ class ChannelIOControl : public ChannelIO {
   };
 
   void Service();
+  // A frame's levels are written: render, map, send, report.
+  void SendFrame(uint32_t frameTick, uint32_t now);
+  void SendToOutputs(uint32_t now, bool newFrame);
   void Arm();
   void ApplyFrame(const Frame& frame);
   void MapTAVOntoDMX();

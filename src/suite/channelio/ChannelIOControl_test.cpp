@@ -155,7 +155,7 @@ TEST_F(Control, ALateFrameGoesAtOnceAndIsCounted) {
   EXPECT_EQ(control.Statistics().maxLatenessMs, 30u);
 }
 
-TEST_F(Control, FramesThatFellDueTogetherLeaveAsOneWithTheNewestLevels) {
+TEST_F(Control, FramesThatFellDueTogetherLeaveAtOnceInOrder) {
   Start();
   Levels(1, 10, 1025);
   control.SendAccumulated(1025);
@@ -164,9 +164,13 @@ TEST_F(Control, FramesThatFellDueTogetherLeaveAsOneWithTheNewestLevels) {
   clock.SetTickCount(1060);  // the loop was busy past both deadlines
   timer.RunUntil(1060);
   auto data = DataOf(1);
-  ASSERT_EQ(data.size(), 1u);
-  EXPECT_EQ(data[0].Slot(1), 20);
-  EXPECT_EQ(control.Statistics().frames, 1u);
+  ASSERT_EQ(data.size(), 2u);
+  EXPECT_EQ(data[0].Slot(1), 10);
+  EXPECT_EQ(data[1].Slot(1), 20);
+  EXPECT_EQ(data[1].tick, 1060u);
+  EXPECT_EQ(data[1].view.sequence, data[0].view.sequence + 1);
+  EXPECT_EQ(control.Statistics().frames, 2u);
+  EXPECT_EQ(control.Statistics().framesLate, 2u);
 }
 
 TEST_F(Control, AWriteComingAfterALaterFrameJoinsItSoTheLaterWriteWins) {

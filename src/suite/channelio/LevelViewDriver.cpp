@@ -70,8 +70,8 @@ void LevelViewDriver::DrawNow(const std::string& status) {
   std::vector<LevelViewRow> rows;
   for (int32_t u : m_selection.universes) {
     const DMXLevels* buffer = m_levels.FindUniverse(u);
-    rows.push_back({"U" + std::to_string(u),
-                    buffer ? std::span<const uint8_t>(buffer->slots) : std::span<const uint8_t>(m_zeros)});
+    rows.push_back({"U" + std::to_string(u), buffer ? std::span<const uint8_t>(buffer->slots)
+                                                    : std::span<const uint8_t>(m_zeros)});
   }
   const auto& units = m_levels.TAVUnits();
   for (auto [network, unit] : m_selection.tavUnits) {
