@@ -86,8 +86,18 @@ if [ $HAVE_OLA = 1 ]; then
   OLA=(ip netns exec "$RX" setpriv --reuid=nobody --regid=nogroup --clear-groups env HOME="$OLACONF")
   "${OLA[@]}" timeout 40 olad -c "$OLACONF" --no-http -l 1 >"$WORK/olad.log" 2>&1 &
   PIDS+=($!)
-  for _ in $(seq 50); do "${OLA[@]}" ola_dev_info 2>/dev/null | grep -q "E1.31" && break; sleep 0.2; done
-  for u in 1 2 3; do "${OLA[@]}" ola_patch -d 1 -p $((u - 1)) -i -u $u; done
+  # The device shows before its ports do: patch until all three universes exist.
+  patched=0
+  for _ in $(seq 50); do
+    if "${OLA[@]}" ola_dev_info 2>/dev/null | grep -q "port 2, IN"; then
+      for u in 1 2 3; do "${OLA[@]}" ola_patch -d 1 -p $((u - 1)) -i -u $u >/dev/null 2>&1 || true; done
+      info=$("${OLA[@]}" ola_uni_info 2>/dev/null || true)
+      if echo "$info" | grep -q "Universe 1" && echo "$info" | grep -q "Universe 2" &&
+         echo "$info" | grep -q "Universe 3"; then patched=1; break; fi
+    fi
+    sleep 0.2
+  done
+  [ $patched = 1 ] || { cat "$WORK/olad.log"; echo "e2e-outputs: FAILED: OLA's E1.31 ports could not be patched"; exit 1; }
   "${OLA[@]}" timeout 30 ola_recorder -r "$OLACONF/recorded.show" -u 1,2,3 >"$WORK/recorder.log" 2>&1 &
   PIDS+=($!)
   wait_for "$WORK/recorder.log" "Recording" || { cat "$WORK/olad.log" "$WORK/recorder.log"; echo "e2e-outputs: FAILED: OLA did not start"; exit 1; }

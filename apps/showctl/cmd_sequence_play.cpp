@@ -8,6 +8,7 @@
 #include <sys/ioctl.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <csignal>
 #include <cstdio>
 #include <iostream>
@@ -154,7 +155,13 @@ int Play(const PlayOptions& o, const std::string& folder) {
   sequence->LoadFile(o.file);
   sequence->SetLoopAtEnd(o.loop);
   sequence->SetLightsOffAtEnd(true);
-  if (o.lookahead >= 0) sequence->SetLookaheadMs(o.lookahead);
+  // Events are handed over one frame ahead: the pump after each frame then
+  // prepares the next one, and the frame timer's wake-up is the only one.
+  int32_t frameMs = 1000 / std::clamp(prefs.RefreshRate(), 1, 1000);
+  const SequenceInfo& info = sequence->Info();
+  if (info.format == "fseq" && info.frameCount > 0)
+    frameMs = static_cast<int32_t>(info.lengthMs / static_cast<int64_t>(info.frameCount));
+  sequence->SetLookaheadMs(o.lookahead >= 0 ? o.lookahead : std::clamp(frameMs, 5, 1000));
 
   std::unique_ptr<LevelViewDriver> view;
   uint32_t started = clock->TickCount();
@@ -174,15 +181,21 @@ int Play(const PlayOptions& o, const std::string& folder) {
                                                std::fwrite(screen.data(), 1, screen.size(), stdout);
                                                std::fflush(stdout);
                                              });
-    control.SetOnFrameSent([&](uint32_t tick) {
-      view->OnFrame(tick, o.file + "  " + Summary(control.Statistics(), elapsed()));
-    });
   }
 
   TimerfdDeadlineTimer pumpTimer(loop);
   bool stopping = false;
+  bool pumping = false;
   uint32_t limitMs = o.seconds > 0 ? static_cast<uint32_t>(o.seconds * 1000) : 0;
   std::function<void()> pump = [&] {
+    // Loading a block of the file may keep the outputs alive, which may
+    // send a frame, whose observer pumps: not again inside a pump.
+    if (pumping) return;
+    pumping = true;
+    struct Done {
+      bool& flag;
+      ~Done() { flag = false; }
+    } done{pumping};
     if (!stopping && limitMs && clock->TickCount() - started >= limitMs) {
       stopping = true;
       sequence->StopPlay();
@@ -207,6 +220,11 @@ int Play(const PlayOptions& o, const std::string& folder) {
     pumpTimer.SetDeadline(next);
   };
   pumpTimer.SetOnDeadline(pump);
+  control.SetOnFrameSent([&](uint32_t tick) {
+    if (view) view->OnFrame(tick, o.file + "  " + Summary(control.Statistics(), elapsed()));
+    // Right after a frame left: prepare the next while the loop is awake.
+    if (!stopping) pump();
+  });
 
   int signals = 0;
   auto onSignal = [&](int) {
@@ -259,7 +277,7 @@ void AddSequencePlayCommand(CLI::App* group, const std::string* folder) {
       ->check(CLI::Range(1, 99));
   play->add_option("--lookahead", o->lookahead,
                    "Hand events to the outputs this many milliseconds before they are due "
-                   "(default 5)")
+                   "(default: one frame)")
       ->check(CLI::Range(0, 1000));
   play->add_flag("--quiet", o->quiet, "Print warnings and errors only");
   play->callback([o, folder] {

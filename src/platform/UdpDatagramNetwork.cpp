@@ -117,33 +117,52 @@ class UdpSender : public DatagramSender {
   SendResult Send(std::span<const OutgoingDatagram> datagrams) override {
     SendResult result;
     size_t n = datagrams.size();
+    if (n == 0) return result;
     if (m_messages.size() < n) {
       m_messages.resize(n);
       m_iov.resize(n);
       m_addresses.resize(n);
     }
+    // A batch for one destination (unicast to one controller) goes through
+    // a connected socket: the kernel then looks the route up once, not per
+    // datagram, which is most of the cost of a large frame.
+    bool one = std::all_of(datagrams.begin(), datagrams.end(), [&](const OutgoingDatagram& d) {
+      return d.destination == datagrams[0].destination;
+    });
+    Connect(one ? std::optional<IPv4Endpoint>(datagrams[0].destination) : std::nullopt);
     for (size_t i = 0; i < n; ++i) {
-      m_addresses[i] = ToSockaddr(datagrams[i].destination);
       m_iov[i].iov_base = const_cast<uint8_t*>(datagrams[i].data);
       m_iov[i].iov_len = datagrams[i].size;
       msghdr& h = m_messages[i].msg_hdr;
       h = {};
-      h.msg_name = &m_addresses[i];
-      h.msg_namelen = sizeof(sockaddr_in);
+      if (!m_connected) {
+        m_addresses[i] = ToSockaddr(datagrams[i].destination);
+        h.msg_name = &m_addresses[i];
+        h.msg_namelen = sizeof(sockaddr_in);
+      }
       h.msg_iov = &m_iov[i];
       h.msg_iovlen = 1;
     }
     size_t i = 0;
+    bool retried = false;
     while (i < n) {
       unsigned chunk = static_cast<unsigned>(std::min(n - i, kMaxBatch));
       int sent = ::sendmmsg(m_fd.Get(), &m_messages[i], chunk, MSG_DONTWAIT);
       if (sent > 0) {
         result.sent += static_cast<size_t>(sent);
         i += static_cast<size_t>(sent);
+        retried = false;
         continue;
       }
       int error = sent < 0 ? errno : EAGAIN;
       if (error == EINTR) continue;
+      // A connected socket reports an earlier datagram's "port unreachable"
+      // on the next send, which then did not happen: once more.
+      if (error == ECONNREFUSED && !retried) {
+        retried = true;
+        continue;
+      }
+      retried = false;
       if (result.error.empty()) result.error = SystemText(error);
       if (error == EAGAIN || error == EWOULDBLOCK || error == ENOBUFS) {
         // The buffer is full: the rest of this batch cannot leave now.
@@ -180,8 +199,26 @@ class UdpSender : public DatagramSender {
   }
 
  private:
+  void Connect(std::optional<IPv4Endpoint> destination) {
+    if (destination == m_connected) return;
+    if (destination) {
+      sockaddr_in remote = ToSockaddr(*destination);
+      if (::connect(m_fd.Get(), reinterpret_cast<sockaddr*>(&remote), sizeof remote) == 0) {
+        m_connected = destination;
+        return;
+      }
+    }
+    if (m_connected) {
+      sockaddr unspecified{};
+      unspecified.sa_family = AF_UNSPEC;
+      ::connect(m_fd.Get(), &unspecified, sizeof unspecified);
+    }
+    m_connected.reset();
+  }
+
   FileDescriptor m_fd;
   std::optional<Interface> m_interface;
+  std::optional<IPv4Endpoint> m_connected;
   std::vector<mmsghdr> m_messages;
   std::vector<iovec> m_iov;
   std::vector<sockaddr_in> m_addresses;

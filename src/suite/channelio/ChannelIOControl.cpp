@@ -81,7 +81,7 @@ void ChannelIOControl::SetupClient(bool boolExclusive, const std::string& szClie
 
 void ChannelIOControl::ReleaseClient() {
   // What was sealed goes out now, a little early, rather than never.
-  if (m_setUp && m_queue.NextSealedDue()) {
+  if (m_setUp && !m_inService && m_queue.NextSealedDue()) {
     m_queue.TakeAllSealed(m_due);
     Service();
   }
@@ -541,22 +541,41 @@ void ChannelIOControl::MapTAVOntoDMX() {
 }
 
 void ChannelIOControl::Service() {
+  // A handler called from here (a frame observer, an output) may call back
+  // in (seal more frames, keep alive): that asks for one more round after
+  // this one rather than running inside it.
+  if (m_inService) {
+    m_serviceAgain = true;
+    return;
+  }
+  m_inService = true;
+  do {
+    m_serviceAgain = false;
+    ServiceOnce();
+  } while (m_serviceAgain);
+  m_inService = false;
+  Arm();
+}
+
+void ChannelIOControl::ServiceOnce() {
   uint32_t now = m_ports.clock->TickCount();
-  m_queue.TakeDue(now, m_due);  // after any frames a release put there
-  if (!m_due.empty()) {
+  std::vector<Frame> due;
+  due.swap(m_due);  // after any frames a release put there
+  m_queue.TakeDue(now, due);
+  if (!due.empty()) {
     // Frames that fell due together leave one after the other, in order,
     // so a late frame is never lost nor held behind a newer one.
-    for (const Frame& frame : m_due) {
+    for (const Frame& frame : due) {
       ApplyFrame(frame);
       SendFrame(frame.dueTick, now);
     }
-    m_queue.Recycle(m_due);
+    m_queue.Recycle(due);
   } else if (m_refreshDue && !TickBefore(now, *m_refreshDue)) {
     SendFrame(*m_refreshDue, now);
   } else {
     SendToOutputs(now, false);
   }
-  Arm();
+  due.swap(m_due);  // keeps the vector's capacity
 }
 
 void ChannelIOControl::SendFrame(uint32_t frameTick, uint32_t now) {

@@ -140,6 +140,7 @@ class ChannelIOControl : public ChannelIO {
   };
 
   void Service();
+  void ServiceOnce();
   // A frame's levels are written: render, map, send, report.
   void SendFrame(uint32_t frameTick, uint32_t now);
   void SendToOutputs(uint32_t now, bool newFrame);
@@ -166,6 +167,8 @@ class ChannelIOControl : public ChannelIO {
   bool m_setUp = false;
   bool m_claimed = false;
   bool m_released = false;
+  bool m_inService = false;
+  bool m_serviceAgain = false;
   bool m_lightsActive = true;
   std::string m_clientName;
   std::optional<NetworkPreferences> m_prefs;
