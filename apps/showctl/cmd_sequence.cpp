@@ -13,6 +13,7 @@
 #include <set>
 
 #include "CommandRegistry.h"
+#include "SequencePlay.h"
 #include "platform/LocalFileSystem.h"
 #include "platform/PlatformPaths.h"
 #include "platform/SystemClock.h"
@@ -166,8 +167,7 @@ void Convert(const SequenceOptions& o) {
 static CommandGroup reg{
     "sequence", [](CLI::App& app) {
       auto options = std::make_shared<SequenceOptions>();
-      auto* group = app.add_subcommand("sequence",
-                                       "Inspect sequence files and convert between their formats");
+      auto* group = app.add_subcommand("sequence", "Inspect, convert and play sequence files");
       group->require_subcommand(1);
       group->add_option(
           "--folder", options->folder,
@@ -194,6 +194,8 @@ static CommandGroup reg{
       convert->add_option("--to", options->to,
                           "Output format, \"plain\" or \"tcs\" (default: by OUT's name)");
       convert->callback([options] { Convert(*options); });
+
+      AddSequencePlayCommand(group, &options->folder);
     }};
 
 }  // namespace tav::showctl

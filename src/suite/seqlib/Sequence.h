@@ -92,6 +92,8 @@ class Sequence {
   bool GetEvent(PlayEvent& event);
   // SequencePlayer::MillisecondsUntilDue; nothing before a load.
   std::optional<int64_t> MillisecondsUntilDue();
+  // See SequencePlayer::NextEventIn; -1 before a load.
+  int64_t NextEventIn();
   int64_t Position() const;
 
   // Completes a command the shell-command manager prepared: it runs in the
