@@ -29,7 +29,7 @@ using SteadyClock = std::chrono::steady_clock;
 // Replies carry what they answer in the low bits and the play generation
 // (bumped by every OpenMedia and Stop) above them, so that the answer to a
 // superseded request is recognised and dropped.
-enum class Reply : uint64_t { kNone = 0, kLoad = 1, kTracks = 2, kDuration = 3 };
+enum class Reply : uint64_t { kNone = 0, kLoad = 1 };
 uint64_t Tag(Reply kind, uint64_t generation) {
   return generation << 2 | static_cast<uint64_t>(kind);
 }
@@ -37,10 +37,12 @@ bool IsTag(uint64_t tag, Reply kind, uint64_t generation) {
   return tag == Tag(kind, generation);
 }
 
-// Observed properties, by the id mpv hands back with each change. (What is
-// fixed for a file is asked for once it is open: a change event would not
-// come when the next file has the same value.)
+// Observed properties, by the id mpv hands back with each change.
 enum Observed : uint64_t { kTimePos = 1, kCurrentAudioOutput = 2 };
+
+// mpv holds a file between opening it and playing it until we let go, so
+// that what it holds is known before a short file can have ended.
+constexpr const char* kOpenedHook = "on_preloaded";
 
 const mpv_node* MapValue(const mpv_node& map, std::string_view key) {
   if (map.format != MPV_FORMAT_NODE_MAP) return nullptr;
@@ -115,11 +117,10 @@ struct MpvMediaPlayer::Impl : std::enable_shared_from_this<Impl> {
   void Drain();
   void Handle(const mpv_event& event);
   void OnLoadReply(const mpv_event& event);
-  void OnPropertyReply(const mpv_event& event);
+  void OnFileOpened(uint64_t hookId);
   void OnStartFile(int64_t entry);
   void OnEndFile(const mpv_event_end_file& end);
   void OnProperty(uint64_t id, const mpv_event_property& property);
-  void PlayWhenKnown();
   void FinishWhenSilent();
   void Finish();
   void Fail(const std::string& reason);
@@ -146,8 +147,7 @@ struct MpvMediaPlayer::Impl : std::enable_shared_from_this<Impl> {
   uint64_t generation = 0;
   int64_t entryId = -1;
   bool entryLive = false;
-  int64_t startedId = -1;                                // the entry of mpv's latest start-file
-  std::optional<SteadyClock::time_point> playbackStart;  // the entry's sound began
+  int64_t startedId = -1;  // the entry of mpv's latest start-file
   std::optional<mpv_event_end_file> lastEnd;
 
   std::string path;
@@ -240,6 +240,7 @@ void MpvMediaPlayer::Impl::Start(const MpvOutputs& wanted) {
   }
   mpv_observe_property(handle, kTimePos, "time-pos", MPV_FORMAT_DOUBLE);
   mpv_observe_property(handle, kCurrentAudioOutput, "current-ao", MPV_FORMAT_STRING);
+  mpv_hook_add(handle, 0, kOpenedHook, 0);
 
   wakeup = std::make_unique<Wakeup>();
   wakeup->loop = &loop;
@@ -284,26 +285,17 @@ void MpvMediaPlayer::Impl::Handle(const mpv_event& event) {
     case MPV_EVENT_COMMAND_REPLY:
       if (IsTag(event.reply_userdata, Reply::kLoad, generation)) OnLoadReply(event);
       break;
-    case MPV_EVENT_GET_PROPERTY_REPLY:
-      OnPropertyReply(event);
-      break;
     case MPV_EVENT_START_FILE:
       OnStartFile(static_cast<const mpv_event_start_file*>(event.data)->playlist_entry_id);
       break;
-    case MPV_EVENT_FILE_LOADED:
-      // What the file holds is read once it is open; asking waits for
-      // nothing, the answer comes as an event.
-      if (entryLive) {
-        mpv_get_property_async(handle, Tag(Reply::kTracks, generation), "track-list",
-                               MPV_FORMAT_NODE);
-        mpv_get_property_async(handle, Tag(Reply::kDuration, generation), "duration",
-                               MPV_FORMAT_DOUBLE);
-      }
+    case MPV_EVENT_HOOK:
+      OnFileOpened(static_cast<const mpv_event_hook*>(event.data)->id);
       break;
     case MPV_EVENT_PLAYBACK_RESTART:
-      if (entryLive && !playbackStart) {
-        playbackStart = SteadyClock::now();
-        PlayWhenKnown();
+      if (entryLive && state == kTransitioning) {
+        if (mediaType.empty()) mediaType = "audio";  // the hook was missed: mpv too old?
+        clock.Run(SteadyClock::now());
+        SetState(kMediaPlaying);
       }
       break;
     case MPV_EVENT_END_FILE:
@@ -343,16 +335,24 @@ void MpvMediaPlayer::Impl::OnLoadReply(const mpv_event& event) {
   if (lastEnd && lastEnd->playlist_entry_id == entryId) OnEndFile(*lastEnd);
 }
 
-void MpvMediaPlayer::Impl::OnPropertyReply(const mpv_event& event) {
-  const auto& property = *static_cast<const mpv_event_property*>(event.data);
-  if (IsTag(event.reply_userdata, Reply::kTracks, generation)) {
-    bool known = event.error >= 0 && property.format == MPV_FORMAT_NODE;
-    mediaType = known ? MediaTypeOfTracks(*static_cast<const mpv_node*>(property.data)) : "audio";
-    PlayWhenKnown();
-  } else if (IsTag(event.reply_userdata, Reply::kDuration, generation) && event.error >= 0 &&
-             property.format == MPV_FORMAT_DOUBLE) {
-    clock.SetEnd(*static_cast<const double*>(property.data));
+// mpv's core waits in the hook, serving requests, until it is continued:
+// these reads are answered at once, and the file cannot go on (or end)
+// before its media type and length are known.
+void MpvMediaPlayer::Impl::OnFileOpened(uint64_t hookId) {
+  if (entryLive) {
+    mpv_node tracks{};
+    if (mpv_get_property(handle, "track-list", MPV_FORMAT_NODE, &tracks) >= 0) {
+      mediaType = MediaTypeOfTracks(tracks);
+      mpv_free_node_contents(&tracks);
+    } else {
+      mediaType = "audio";
+    }
+    double duration = 0;
+    if (mpv_get_property(handle, "duration", MPV_FORMAT_DOUBLE, &duration) >= 0) {
+      clock.SetEnd(duration);
+    }
   }
+  mpv_hook_continue(handle, hookId);
 }
 
 void MpvMediaPlayer::Impl::OnStartFile(int64_t entry) {
@@ -381,14 +381,6 @@ void MpvMediaPlayer::Impl::OnEndFile(const mpv_event_end_file& end) {
       Finish();
       break;
   }
-}
-
-// Playing once the sound has begun and what the media holds is known: a
-// handler of the play-state change asks for the media type.
-void MpvMediaPlayer::Impl::PlayWhenKnown() {
-  if (!entryLive || state != kTransitioning || !playbackStart || mediaType.empty()) return;
-  clock.Run(*playbackStart);
-  SetState(kMediaPlaying);
 }
 
 // mpv ends a file when the last sound has been handed to the audio output,
@@ -447,7 +439,6 @@ void MpvMediaPlayer::Impl::BeginNewPlay() {
   ++generation;
   entryId = -1;
   entryLive = false;
-  playbackStart.reset();
   tailTimer.cancel();
   clock.Reset();
 }

@@ -9,10 +9,11 @@
 // Threads: mpv runs its own threads, which touch nothing of ours but a
 // wakeup flag: its wakeup callback only posts a drain to the event loop, and
 // events are read and handled there. No call into mpv from this class waits
-// for mpv's core (a core busy opening a sound device would otherwise stall
-// the loop and the lights with it), so every command is asynchronous. The
-// PlayStateChange and MediaError events are raised from the loop, never from
-// inside a call made on this object.
+// for a busy core (one opening or draining a sound device would stall the
+// loop, and the lights with it): commands are asynchronous, and the only
+// reads, of what a file holds, are made while the core waits for them in a
+// hook. The PlayStateChange and MediaError events are raised from the loop,
+// never from inside a call made on this object.
 //
 // Outputs (MpvOutputs, from the settings' "Media" section): an audio output
 // that cannot be opened (no sound card, no sound server, a busy or missing

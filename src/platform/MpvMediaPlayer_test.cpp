@@ -68,6 +68,7 @@ class MpvMediaPlayerTest : public ::testing::Test {
     player->SetOnPlayStateChange([this](int32_t state) {
       EXPECT_FALSE(insideCall) << "PlayStateChange raised inside a call";
       states.push_back(state);
+      if (state == MpvMediaPlayer::kTransitioning) positionSeen = 0;  // a new play
       if (state == kMediaPlaying) typeWhenPlaying = player->CurrentMediaItemInfo("MediaType");
       if (state == kMediaStopped) lastPositionPlaying = positionSeen;
     });
@@ -94,8 +95,6 @@ class MpvMediaPlayerTest : public ::testing::Test {
         double position = player->CurrentPosition();
         EXPECT_GE(position, positionSeen) << "the position went back";
         positionSeen = position;
-      } else {
-        positionSeen = 0;
       }
     }
     return true;
@@ -242,6 +241,17 @@ TEST_F(MpvMediaPlayerTest, ThePlayerMayBeDestroyedFromItsOwnEvent) {
   Open(tone);
   ASSERT_TRUE(RunUntil([&] { return destroyed; }));
   loop.RunFor(50ms);  // whatever mpv had posted finds nobody
+}
+
+TEST_F(MpvMediaPlayerTest, ThePlayerMayBeDestroyedAtAnyMomentOfALoad) {
+  std::string tone = folder.Write("tone.wav", ToneWav(1.0));
+  for (auto delay : {0ms, 2ms, 5ms, 10ms, 20ms, 40ms}) {
+    Make({"null", "", "null"});
+    Open(tone);
+    loop.RunFor(delay);
+    player.reset();  // must neither hang (mpv waiting for us) nor touch freed memory
+  }
+  loop.RunFor(20ms);
 }
 
 }  // namespace
