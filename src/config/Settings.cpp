@@ -45,6 +45,9 @@ const std::vector<SettingDescription>& KnownSettings() {
       Describe(kAppPath),
       Describe(kUserDataPath),
       Describe(kUseCompressedSequences),
+      Describe(kAudioOutput),
+      Describe(kAudioDevice),
+      Describe(kVideoOutput),
   };
   return all;
 }
