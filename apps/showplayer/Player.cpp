@@ -67,7 +67,9 @@ UniverseMap UniverseMapOf(const NetworkPreferences& prefs) {
   return spans.empty() ? UniverseMap::Uniform() : UniverseMap::FromSpans(std::move(spans));
 }
 
-void Say(const std::string& text) { std::fprintf(stderr, "showplayer: %s\n", text.c_str()); }
+void Say(const std::string& text) {
+  std::fprintf(stderr, "showplayer: %s\n", text.c_str());
+}
 
 int ExitStatusOf(HostEnd end) {
   switch (end) {
@@ -139,8 +141,8 @@ int RunPlayer(const PlayerOptions& options) {
   } catch (const Error&) {
     // The engine reads them again and reports what is wrong.
   }
-  auto library = std::make_shared<FileSequenceLibrary>(clock, fileSystem, resolver,
-                                                       UniverseMapOf(prefs));
+  auto library =
+      std::make_shared<FileSequenceLibrary>(clock, fileSystem, resolver, UniverseMapOf(prefs));
   auto memory = std::make_shared<LinuxProcessMemory>();
   auto shellCommands = std::make_shared<SpawningShellCommandManager>(
       std::make_shared<PosixProcessSpawner>(), timers);
@@ -202,14 +204,14 @@ int RunPlayer(const PlayerOptions& options) {
   if (options.view) {
     LevelViewSelection selection;
     std::string error;
-    if (!options.viewSpec.empty() &&
-        !ParseLevelViewSelection(options.viewSpec, selection, error)) {
+    if (!options.viewSpec.empty() && !ParseLevelViewSelection(options.viewSpec, selection, error)) {
       Say("--view=" + options.viewSpec + ": " + error);
       return kExitShowsNotEnabled;
     }
     if (selection.universes.empty() && selection.tavUnits.empty()) {
       for (int32_t i = 0; i < prefs.DMXUniverseCount(); ++i) {
-        if (prefs.DMXUniverse(i).Enabled()) selection.universes.push_back(prefs.DMXUniverse(i).Universe());
+        if (prefs.DMXUniverse(i).Enabled())
+          selection.universes.push_back(prefs.DMXUniverse(i).Universe());
       }
     }
     screen = std::make_unique<TerminalScreen>(

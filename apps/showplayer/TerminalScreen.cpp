@@ -50,7 +50,9 @@ TerminalScreen::TerminalScreen(ChannelIOControl& control, LevelViewSelection sel
   m_driver->DrawNow(m_status());
 }
 
-TerminalScreen::~TerminalScreen() { m_control.SetOnFrameSent(nullptr); }
+TerminalScreen::~TerminalScreen() {
+  m_control.SetOnFrameSent(nullptr);
+}
 
 void TerminalScreen::Idle() {
   if (m_clock.TickCount() - m_lastDrawn >= kIdleIntervalMs) m_driver->DrawNow(m_status());
