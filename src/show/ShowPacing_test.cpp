@@ -3,6 +3,7 @@
 // on virtual time, must leave the same record, line for line and
 // millisecond for millisecond.
 
+#include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -156,6 +157,56 @@ TEST(ShowPacing, WakingWhenDueDoesExactlyWhatTickingEveryMillisecondDoes) {
   RecordProperty("TicksEveryMillisecond", std::to_string(everyMsTicks));
   RecordProperty("TicksWakeWhenDue", std::to_string(wakeTicks));
   EXPECT_LT(wakeTicks * 5, everyMsTicks);
+}
+
+TEST(ShowPacing, AnIdleEngineNeverWakesAndTicksOnceForEachOfferOfNoShow) {
+  ShowRig rig;
+  rig.Start();
+  rig.Advance(60'000);
+  EXPECT_EQ(rig.timers.TicksFired("tmrShowPlayer"), 0u);
+  // The host offers "no show" every second: one tick each, which finds no
+  // show, asks for the restart check and switches the timer off again.
+  for (uint64_t t = 1000; t <= 10'000; t += 1000) {
+    rig.At(t, [&] { rig.player->SetNextShow(nullptr); });
+  }
+  rig.Advance(60'000);
+  EXPECT_EQ(rig.timers.TicksFired("tmrShowPlayer"), 10u);
+  EXPECT_EQ(rig.host.RestartChecks(), 10);
+}
+
+TEST(ShowPacing, OneSequenceAtFortyFramesASecondWakesTheEngineOncePerFrame) {
+  ShowRig rig;
+  rig.WriteSequence("frames.tseq", Frames(1, 1, 16, 60'000));
+  rig.Start();
+  ShowParts parts;
+  parts.main = {"frames.tseq"};
+  rig.player->SetNextShow(rig.MakeShow("xmas.tsh", parts));
+  rig.Advance(1000);
+  uint64_t before = rig.timers.TicksFired("tmrShowPlayer");
+  rig.Advance(10'000);
+  uint64_t perSecond = (rig.timers.TicksFired("tmrShowPlayer") - before) / 10;
+  EXPECT_GE(perSecond, 40u);
+  EXPECT_LE(perSecond, 41u);
+}
+
+TEST(ShowPacing, AShowWaitingForItsTriggerWakesOnceASecond) {
+  ShowRig rig;
+  rig.WriteSequence("main.tseq", Frames(1, 1, 1, 1000));
+  rig.Start();
+  ShowParts parts;
+  parts.main = {"main.tseq"};
+  parts.startupType = 1;
+  parts.startupTrigger = NewTrigger(1, 1, 1, "go");
+  rig.player->SetNextShow(rig.MakeShow("xmas.tsh", parts));
+  rig.Advance(1000);
+  uint64_t before = rig.timers.TicksFired("tmrShowPlayer");
+  rig.Advance(60'000);
+  EXPECT_EQ(rig.timers.TicksFired("tmrShowPlayer") - before, 60u);
+  // A press wakes it at once.
+  rig.At(500, [&] { rig.Press(1, 1, 1, "go"); });
+  rig.Advance(501);
+  EXPECT_THAT(rig.timeline.TimedTexts("log 1 Starting <"),
+              ::testing::ElementsAre("61501 log 1 Starting <main.tseq>"));
 }
 
 }  // namespace

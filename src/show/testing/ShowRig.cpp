@@ -29,6 +29,12 @@ ShowRig::ShowRig(DateTime start)
   });
   // Exports would add files and log lines the shows here do not need.
   settings.Set(settings::kUseCompressedSequences, false);
+  auto files = LocalFileSystem();
+  auto resolver =
+      std::make_shared<PathResolver>(files, [dir = m_folder.Path()](int32_t) { return dir; });
+  auto library = std::make_shared<FileSequenceLibrary>(clock, files, resolver);
+  sequenceServices = {library, resolver, files,
+                      &host,   memory,   [this] { return settings.UseCompressedSequences(); }};
   double next = 0.0;
   random = [next]() mutable {
     next += 0.37;
@@ -102,17 +108,12 @@ std::shared_ptr<InteractiveGroup> ShowRig::Group(bool independent, bool interrup
 }
 
 void ShowRig::Start(ShowPlayer::Pacing pacing) {
-  auto files = LocalFileSystem();
-  auto resolver =
-      std::make_shared<PathResolver>(files, [dir = m_folder.Path()](int32_t) { return dir; });
-  auto library = std::make_shared<FileSequenceLibrary>(clock, files, resolver);
   ShowPlayerServices services;
   services.clock = clock.get();
   services.settings = &settings;
   services.registry = &registry;
   services.memory = memory;
-  services.sequences = {library, resolver, files,
-                        &host,   memory,   [this] { return settings.UseCompressedSequences(); }};
+  services.sequences = sequenceServices;
   services.shellCommands = &shell;
   services.random = random;
   player = std::make_unique<ShowPlayer>(std::move(services));

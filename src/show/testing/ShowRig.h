@@ -98,6 +98,9 @@ class ShowRig {
   ScriptedMediaPlayer media;
   RecordingShellCommandManager shell;
   RecordingShowHost host;
+  // What every sequence the engine makes is given: the real sequence
+  // library and file system over the rig's folder (kinds 2 and 3 both).
+  SequencePlayServices sequenceServices;
   std::unique_ptr<Timer> tmrShowPlayer;
   std::unique_ptr<ShowPlayer> player;
   // Fixed unless a test sets it before Start.
