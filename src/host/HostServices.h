@@ -46,13 +46,13 @@ struct HostServices {
 
   // What the platform shows in a message box (the program has no window: the
   // entry point writes it to standard error). The form logs it as well.
-  std::function<void(const std::string& text)> messageBox;
+  std::function<void(const std::string& text)> messageBox = {};
   // Called once, when the form has unloaded: the program ends.
-  std::function<void()> onUnloaded;
+  std::function<void()> onUnloaded = {};
   // Called with the engine's network preferences once it has applied them
   // (at load, and after each change announced in the registry), so that
   // the composition root can place FSEQ channels on the new universes.
-  std::function<void(const NetworkPreferences&)> networkPreferencesApplied;
+  std::function<void(const NetworkPreferences&)> networkPreferencesApplied = {};
 };
 
 }  // namespace tav

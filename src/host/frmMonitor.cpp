@@ -64,7 +64,8 @@ frmMonitor::frmMonitor(HostServices services)
       m_settings(m_services.registry, m_services.pathDefaults),
       m_outbox(m_services.trayLink),
       m_log(m_services.clock, m_outbox),
-      m_CIO(std::make_shared<SimulatedInputControl>(m_services.cio)) {
+      m_CIO(std::make_shared<SimulatedInputControl>(m_services.cio)),
+      m_watchdog(m_settings, *m_services.memory, m_services.clock) {
   m_log.SetEcho([this](int32_t level, DateTime now, const std::string& text) {
     if (m_logEcho && !TrayConnected()) m_logEcho(level, now, text);
   });
@@ -266,11 +267,14 @@ void frmMonitor::RequestGracefulShutdown() {
 
 void frmMonitor::ShutdownForRestartIfNecessary() {
   if (Unloaded()) return;
+  WatchdogHostState state{m_gracefulShutdownPending, m_shutdownRequested, m_showLoadedSinceStart,
+                          m_startTime};
+  if (m_watchdog.RestartIsDue(state, *this)) ShutdownForRestart();
 }
 
 void frmMonitor::ShutdownForRestart() {
   m_restartRequested = true;
-  ImmediateShutdown("Show Player shutting down for restart");
+  ImmediateShutdown(MemoryWatchdog::kRestartReason);
 }
 
 void frmMonitor::SimulateInput(int32_t network, int32_t unitId, int32_t inputNumber) {

@@ -30,6 +30,7 @@
 #include "config/Settings.h"
 #include "host/HostLog.h"
 #include "host/HostServices.h"
+#include "host/MemoryWatchdog.h"
 #include "host/SimulatedInputControl.h"
 #include "host/TrayHost.h"
 #include "host/TrayMessaging.h"
@@ -186,6 +187,7 @@ class frmMonitor : public TrayHost, public ShowPlayerHost {
   // The I/O control as the engine sees it: the real one, with inputs the
   // tray simulates raised as if it had raised them.
   std::shared_ptr<SimulatedInputControl> m_CIO;
+  MemoryWatchdog m_watchdog;
   std::unique_ptr<RegistryWatcher> m_registryWatcher;
   std::shared_ptr<RegistryCallback> m_registryCallback;
 

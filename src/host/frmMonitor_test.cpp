@@ -201,6 +201,29 @@ TEST_F(FormTest, AMissingShowFileIsLoggedAndNoShowStarts) {
   EXPECT_GE(rig.CountLogged("Cannot read show file: gone.show"), 2);
 }
 
+TEST_F(FormTest, GrownMemoryEndsAnIdlePlayerForARestartOnceTheStartIsFiveMinutesPast) {
+  rig.WriteWeekSchedule({});
+  rig.memory->Set(200 * 1024 * 1024);
+  rig.Load();
+  rig.Advance(299 * kSecond);
+  EXPECT_EQ(rig.unloads, 0);
+  ASSERT_TRUE(rig.AdvanceUntil([&] { return rig.unloads == 1; }, 3 * kSecond));
+  EXPECT_EQ(rig.form->End(), HostEnd::kRestart);
+  EXPECT_THAT(
+      std::vector<std::string>(rig.Lines().end() - 2, rig.Lines().end()),
+      ElementsAre("1 Show Player shutting down for restart", "1 Show Player shutting down"));
+}
+
+TEST_F(FormTest, AShowPlayedSinceTheStartEndsTheRestartSuppressionEarly) {
+  rig.WriteWeekSchedule({{"quiet.show", rig.start, rig.start.AddSeconds(20)}});
+  rig.memory->Set(200 * 1024 * 1024);
+  rig.Load();
+  ASSERT_TRUE(rig.AdvanceUntil([&] { return rig.unloads == 1; }, 60 * kSecond, 10));
+  EXPECT_TRUE(rig.Logged("Finished show: quiet.show"));
+  EXPECT_EQ(rig.form->End(), HostEnd::kRestart);
+  EXPECT_LT(rig.NowMs(), 60u * kSecond);
+}
+
 TEST_F(FormTest, APortHeldByAnotherProgramGivesThe8005TextAndUnloads) {
   ScheduleXmasForAnHour();
   rig.cio->FailNext("SetupClient", kErrorPortAlreadyOpen, "The comm port is already open");
@@ -271,10 +294,13 @@ TEST_F(FormTest, ANetworkSettingsChangeReachesTheEngine) {
   rig.WriteWeekSchedule({});
   rig.Load();
   rig.Advance(2 * kSecond);
+  EXPECT_EQ(rig.networkPreferencesApplied, 1);
   SetStringSetting(rig.registry, "Ver", "Network", "two");
   rig.Advance(2 * kSecond);
   EXPECT_TRUE(rig.Logged("A Network Config Registry Change was detected"));
   EXPECT_TRUE(rig.Logged("No actual network changes detected"));
+  // The composition root hears of it, to place FSEQ channels anew.
+  EXPECT_EQ(rig.networkPreferencesApplied, 2);
 }
 
 TEST_F(FormTest, APlaybackFileIsLoggedWithWhatWasChosen) {

@@ -98,6 +98,8 @@ void HostRig::Create() {
             ++unloads;
             unloadedAtMs = timers.NowMs();
           },
+      .networkPreferencesApplied =
+          [this](const NetworkPreferences&) { ++networkPreferencesApplied; },
   };
   form = std::make_unique<frmMonitor>(std::move(services));
   form->SetLogEcho([this](int32_t level, DateTime, const std::string& text) {

@@ -107,6 +107,8 @@ class HostRig {
   std::unique_ptr<frmMonitor> form;
   std::vector<std::string> messageBoxes;
   int unloads = 0;
+  // How often the engine's network preferences were reported as applied.
+  int networkPreferencesApplied = 0;
   // When each unload happened, virtual ms.
   uint64_t unloadedAtMs = 0;
 
