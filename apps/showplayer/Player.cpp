@@ -2,9 +2,11 @@
 
 #include <csignal>
 #include <cstdio>
+#include <cstdlib>
 #include <memory>
 
 #include "ConsoleLog.h"
+#include "SyncProbe.h"
 #include "TerminalScreen.h"
 #include "config/NetworkPreferences.h"
 #include "config/Settings.h"
@@ -215,7 +217,7 @@ int RunPlayer(const PlayerOptions& options) {
       }
     }
     screen = std::make_unique<TerminalScreen>(
-        *control, std::move(selection), console, *clock, timers, [&]() -> std::string {
+        control->Levels(), std::move(selection), console, *clock, timers, [&]() -> std::string {
           std::string show = "no show";
           if (ShowPlayer* engine = monitor.Engine(); engine && engine->CurrentShow()) {
             show = engine->CurrentShow()->Monitoring()->Filename();
@@ -226,9 +228,27 @@ int RunPlayer(const PlayerOptions& options) {
         });
   }
 
+  std::unique_ptr<SyncProbe> probe;
+  if (const char* where = std::getenv("TAV_SYNC_PROBE")) {
+    if (auto parsed = SyncProbe::Parse(where)) {
+      probe = std::make_unique<SyncProbe>(control->Levels(), *media, *parsed);
+    } else {
+      Say(std::string("TAV_SYNC_PROBE=") + where + " is not UNIVERSE:SLOT:PERIOD_MS; no probe");
+    }
+  }
+  // The view and the probe look at the levels right after a frame went out.
+  if (screen || probe) {
+    control->SetOnFrameSent([&](uint32_t tick) {
+      if (screen) screen->OnFrame(tick);
+      if (probe) probe->OnFrame();
+    });
+  }
+
   monitor.Form_Load(options.commandLine);
   if (!monitor.Unloaded()) loop.Run();
+  control->SetOnFrameSent(nullptr);
   if (screen) screen->Finish();
+  if (probe) Say(probe->Report());
   return ExitStatusOf(monitor.End());
 }
 

@@ -31,10 +31,10 @@ bool TerminalSpeaksUnicode() {
 
 }  // namespace
 
-TerminalScreen::TerminalScreen(ChannelIOControl& control, LevelViewSelection selection,
+TerminalScreen::TerminalScreen(const LevelBuffers& levels, LevelViewSelection selection,
                                ConsoleLog& log, const Clock& clock, TimerService& timers,
                                std::function<std::string()> status)
-    : m_control(control), m_log(log), m_clock(clock), m_status(std::move(status)) {
+    : m_log(log), m_clock(clock), m_status(std::move(status)) {
   LevelViewOptions options;
   options.width = TerminalWidth();
   options.unicode = TerminalSpeaksUnicode();
@@ -42,16 +42,17 @@ TerminalScreen::TerminalScreen(ChannelIOControl& control, LevelViewSelection sel
   options.compact = true;
   m_log.KeepForView(kLogLines);
   m_driver = std::make_unique<LevelViewDriver>(
-      control.Levels(), std::move(selection), options, kDrawIntervalMs,
+      levels, std::move(selection), options, kDrawIntervalMs,
       [this](const std::vector<std::string>& lines) { Draw(lines); });
   std::fputs("\x1b[2J", stdout);
-  m_control.SetOnFrameSent([this](uint32_t tick) { m_driver->OnFrame(tick, m_status()); });
   m_idle = timers.CreateTimer("terminalView", kIdleIntervalMs, true, [this] { Idle(); });
   m_driver->DrawNow(m_status());
 }
 
-TerminalScreen::~TerminalScreen() {
-  m_control.SetOnFrameSent(nullptr);
+TerminalScreen::~TerminalScreen() = default;
+
+void TerminalScreen::OnFrame(uint32_t tick) {
+  m_driver->OnFrame(tick, m_status());
 }
 
 void TerminalScreen::Idle() {
@@ -71,7 +72,6 @@ void TerminalScreen::Draw(const std::vector<std::string>& levelLines) {
 
 void TerminalScreen::Finish() {
   m_idle->SetEnabled(false);
-  m_control.SetOnFrameSent(nullptr);
   m_driver->DrawNow(m_status());
   m_log.KeepForView(0);
 }

@@ -1,8 +1,8 @@
 #pragma once
 // The terminal view of `showplayer --view`: the levels of the chosen
 // universes, drawn a few times a second right after a frame has gone out
-// (never in the way of the next one), with a status line on top and the
-// latest log lines below. When no frame goes out (no show), the log part is
+// (OnFrame, never in the way of the next frame), with a status line on top
+// and the latest log lines below. When no frame goes out (no show), the log part is
 // still brought up to date once a second.
 //
 // Owned by the composition root, beside the control whose levels it reads;
@@ -16,7 +16,7 @@
 #include "ConsoleLog.h"
 #include "ports/Clock.h"
 #include "ports/TimerService.h"
-#include "suite/channelio/ChannelIOControl.h"
+#include "suite/channelio/LevelBuffers.h"
 #include "suite/channelio/LevelViewDriver.h"
 
 namespace tav::player {
@@ -26,10 +26,12 @@ class TerminalScreen {
   // Lines of log kept below the levels.
   static constexpr size_t kLogLines = 8;
 
-  TerminalScreen(ChannelIOControl& control, LevelViewSelection selection, ConsoleLog& log,
+  TerminalScreen(const LevelBuffers& levels, LevelViewSelection selection, ConsoleLog& log,
                  const Clock& clock, TimerService& timers, std::function<std::string()> status);
   ~TerminalScreen();
 
+  // After every frame the control has sent.
+  void OnFrame(uint32_t tick);
   // Draws once more and leaves the cursor below the view.
   void Finish();
 
@@ -37,7 +39,6 @@ class TerminalScreen {
   void Draw(const std::vector<std::string>& levelLines);
   void Idle();
 
-  ChannelIOControl& m_control;
   ConsoleLog& m_log;
   const Clock& m_clock;
   std::function<std::string()> m_status;
