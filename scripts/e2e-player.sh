@@ -73,10 +73,12 @@ fail() {
   exit 1
 }
 
-# Waits up to $2 seconds for the fixed text $1 in file $3.
+# Waits up to $2 seconds for the text $1 (an extended regular expression
+# with WAIT_RE=1, else fixed) in file $3.
 wait_for() {
-  local deadline=$((SECONDS + $2))
-  until grep -qF -- "$1" "$3" 2>/dev/null; do
+  local deadline=$((SECONDS + $2)) mode=-qF
+  [ -z "${WAIT_RE:-}" ] || mode=-qE
+  until grep $mode -- "$1" "$3" 2>/dev/null; do
     [ $SECONDS -lt $deadline ] || fail "no \"$1\" within $2 s"
     [ -z "$player_pid" ] || kill -0 "$player_pid" 2>/dev/null || fail "the player ended early"
     sleep 0.2
@@ -112,8 +114,8 @@ monitor_pid=$!
 wait_for "Starting show: demo.show" 20 "$work/monitor.log"
 wait_for "Registering interactive triggers" 20 "$work/monitor.log"
 "$showctl" trigger 1 1 1
-wait_for "Starting Interactive: doorbell.tseq" 5 "$work/monitor.log"
-grep -qE "^start +doorbell.tseq" "$work/monitor.log" || fail "no sequence-start notice for doorbell.tseq"
+WAIT_RE=1 wait_for "Starting Interactive: (.*/)?doorbell.tseq" 5 "$work/monitor.log"
+grep -qE "^start +(.*/)?doorbell.tseq" "$work/monitor.log" || fail "no sequence-start notice for doorbell.tseq"
 echo "e2e-player: the demo show plays and showctl trigger rang the doorbell"
 
 # 3. A show on demand replaces it (the musical piece may finish first).
