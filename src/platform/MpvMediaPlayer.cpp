@@ -196,6 +196,9 @@ void MpvMediaPlayer::Impl::Start(const MpvOutputs& wanted) {
       {"load-scripts", "no"},
       {"ytdl", "no"},
       {"osc", "no"},
+      {"load-stats-overlay", "no"},  // each built-in script is a thread with a Lua state
+      {"load-osd-console", "no"},
+      {"load-auto-profiles", "no"},
       {"input-default-bindings", "no"},
       {"input-vo-keyboard", "no"},
       {"osd-level", "0"},
