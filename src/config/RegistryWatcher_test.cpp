@@ -78,6 +78,25 @@ TEST_F(RegistryWatcherTest, ReappearingWithTheOldTextOrEmptyCallsNothing) {
   EXPECT_EQ(Calls(), 1u);
 }
 
+TEST_F(RegistryWatcherTest, AValueOfAnotherTypeReadsAsEmpty) {
+  auto writeBinary = [&] {
+    RegistryCreateKey(store, SharedSettingsKey("Network"));
+    RegistrySetValue(store, SharedSettingsKey("Network"), "Ver", RegistryValue::Binary("\x01\x02"));
+  };
+  writeBinary();
+  EXPECT_FALSE(Arm());  // nothing to watch yet
+
+  Write("A");
+  ASSERT_TRUE(Arm());
+  writeBinary();
+  EXPECT_NO_THROW(timers.Advance(3000));
+  EXPECT_EQ(Calls(), 0u);
+  EXPECT_EQ(watcher.LastValue(), "A");
+  Write("B");
+  timers.Advance(1000);
+  EXPECT_EQ(Calls(), 1u);
+}
+
 TEST_F(RegistryWatcherTest, PollsOnlyOnTicks) {
   Write("A");
   ASSERT_TRUE(Arm());
