@@ -6,6 +6,7 @@
 
 #include <fmt/format.h>
 
+#include <chrono>
 #include <cstdio>
 #include <fstream>
 #include <iostream>
@@ -43,6 +44,16 @@ FileRegistryStore OpenStore(const SettingsOptions& o) {
   return FileRegistryStore(SettingsFile(o), [](const std::string& problem) {
     std::cerr << "showctl: warning: " << problem << "\n";
   });
+}
+
+// The store never waits for another program's lock; a command that ends
+// right after writing waits a little here, and reports a change it could
+// not write rather than success.
+void FinishWriting(FileRegistryStore& store) {
+  if (store.WritePendingChanges(std::chrono::seconds(5))) return;
+  store.DropPendingChanges();
+  throw CommandFailed(fmt::format(
+      "could not write {}: another program kept it locked; it was left unchanged", store.Path()));
 }
 
 const SettingDescription* FindKnown(const std::string& name,
@@ -137,6 +148,7 @@ void Set(const SettingsOptions& o) {
   } else {
     SetStringSetting(store, o.name, section, o.value);
   }
+  FinishWriting(store);
 }
 
 void ListKey(FileRegistryStore& store, const std::string& key, const std::string& prefix) {
@@ -219,6 +231,7 @@ void Import(const SettingsOptions& o) {
   if (status != kRegistryOk) {
     throw CommandFailed(fmt::format("could not write {}; it was left unchanged", store.Path()));
   }
+  FinishWriting(store);
   std::cout << fmt::format("imported {} value{} into {}\n", values, values == 1 ? "" : "s",
                            store.Path());
 }
