@@ -5,6 +5,7 @@
 #include "config/LibRegistry.h"
 #include "config/MemoryRegistryStore.h"
 #include "ports/testing/VirtualTimerService.h"
+#include "support/Error.h"
 
 namespace tav {
 namespace {
