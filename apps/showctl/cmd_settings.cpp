@@ -6,6 +6,7 @@
 
 #include <fmt/format.h>
 
+#include <chrono>
 #include <cstdio>
 #include <fstream>
 #include <iostream>
@@ -37,6 +38,16 @@ struct SettingsOptions {
 
 FileRegistryStore OpenStore(const SettingsOptions& o) {
   return OpenSettingsStore(o.file);
+}
+
+// The store never waits for another program's lock; a command that ends
+// right after writing waits a little here, and reports a change it could
+// not write rather than success.
+void FinishWriting(FileRegistryStore& store) {
+  if (store.WritePendingChanges(std::chrono::seconds(5))) return;
+  store.DropPendingChanges();
+  throw CommandFailed(fmt::format(
+      "could not write {}: another program kept it locked; it was left unchanged", store.Path()));
 }
 
 const SettingDescription* FindKnown(const std::string& name,
@@ -114,6 +125,7 @@ void Set(const SettingsOptions& o) {
   } else {
     SetStringSetting(store, o.name, section, o.value);
   }
+  FinishWriting(store);
 }
 
 void ListKey(FileRegistryStore& store, const std::string& key, const std::string& prefix) {
@@ -196,6 +208,7 @@ void Import(const SettingsOptions& o) {
   if (status != kRegistryOk) {
     throw CommandFailed(fmt::format("could not write {}; it was left unchanged", store.Path()));
   }
+  FinishWriting(store);
   std::cout << fmt::format("imported {} value{} into {}\n", values, values == 1 ? "" : "s",
                            store.Path());
 }
