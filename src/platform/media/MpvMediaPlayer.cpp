@@ -1,4 +1,4 @@
-#include "platform/MpvMediaPlayer.h"
+#include "platform/media/MpvMediaPlayer.h"
 
 #include <mpv/client.h>
 
@@ -14,7 +14,7 @@
 #include <vector>
 
 #include "config/Settings.h"
-#include "platform/MediaClock.h"
+#include "platform/media/MediaClock.h"
 #include "support/Error.h"
 
 // Playlist entry ids in the loadfile reply and the start/end events.

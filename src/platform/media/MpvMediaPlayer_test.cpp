@@ -1,4 +1,4 @@
-#include "platform/MpvMediaPlayer.h"
+#include "platform/media/MpvMediaPlayer.h"
 
 #include <gtest/gtest.h>
 
