@@ -40,16 +40,6 @@ FileRegistryStore OpenStore(const SettingsOptions& o) {
   return OpenSettingsStore(o.file);
 }
 
-// The store never waits for another program's lock; a command that ends
-// right after writing waits a little here, and reports a change it could
-// not write rather than success.
-void FinishWriting(FileRegistryStore& store) {
-  if (store.WritePendingChanges(std::chrono::seconds(5))) return;
-  store.DropPendingChanges();
-  throw CommandFailed(fmt::format(
-      "could not write {}: another program kept it locked; it was left unchanged", store.Path()));
-}
-
 const SettingDescription* FindKnown(const std::string& name,
                                     const std::optional<std::string>& section) {
   for (const auto& s : KnownSettings()) {
