@@ -1,6 +1,8 @@
 #pragma once
-// Test double for the MessageLog port: keeps every line with its level.
-// Header only.
+// Test double for the MessageLog port: keeps every line as "<level> <text>",
+// with " [seq]" appended when a sequence was given, so a test can compare
+// what was logged with one list; and every line with its level, for tests
+// that look for a part of a text.
 
 #include <algorithm>
 #include <string>
@@ -16,10 +18,13 @@ class RecordingMessageLog : public MessageLog {
     int32_t level;
     std::string text;
   };
+
   void LogMessage(int32_t level, const std::string& szText,
-                  const SequenceIdentity* = nullptr) override {
+                  const SequenceIdentity* seqInfo = nullptr) override {
+    lines.push_back(std::to_string(level) + " " + szText + (seqInfo ? " [seq]" : ""));
     m_lines.push_back({level, szText});
   }
+
   const std::vector<Line>& Lines() const { return m_lines; }
   std::vector<std::string> Texts() const {
     std::vector<std::string> texts;
@@ -32,7 +37,12 @@ class RecordingMessageLog : public MessageLog {
       return l.text.find(part) != std::string::npos;
     }));
   }
-  void Clear() { m_lines.clear(); }
+  void Clear() {
+    lines.clear();
+    m_lines.clear();
+  }
+
+  std::vector<std::string> lines;
 
  private:
   std::vector<Line> m_lines;

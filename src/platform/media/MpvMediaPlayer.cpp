@@ -1,4 +1,4 @@
-#include "platform/MpvMediaPlayer.h"
+#include "platform/media/MpvMediaPlayer.h"
 
 #include <mpv/client.h>
 
@@ -14,7 +14,7 @@
 #include <vector>
 
 #include "config/Settings.h"
-#include "platform/MediaClock.h"
+#include "platform/media/MediaClock.h"
 #include "support/Error.h"
 
 // Playlist entry ids in the loadfile reply and the start/end events.
@@ -25,17 +25,6 @@ namespace {
 
 constexpr const char* kSource = "MpvMediaPlayer";
 using SteadyClock = std::chrono::steady_clock;
-
-// Replies carry what they answer in the low bits and the play generation
-// (bumped by every OpenMedia and Stop) above them, so that the answer to a
-// superseded request is recognised and dropped.
-enum class Reply : uint64_t { kNone = 0, kLoad = 1 };
-uint64_t Tag(Reply kind, uint64_t generation) {
-  return generation << 2 | static_cast<uint64_t>(kind);
-}
-bool IsTag(uint64_t tag, Reply kind, uint64_t generation) {
-  return tag == Tag(kind, generation);
-}
 
 // Observed properties, by the id mpv hands back with each change.
 enum Observed : uint64_t { kTimePos = 1, kCurrentAudioOutput = 2 };
@@ -133,7 +122,7 @@ struct MpvMediaPlayer::Impl : std::enable_shared_from_this<Impl> {
   void PostToHandler(Call call);
 
   void SetPropertyAsync(const char* name, const std::string& value);
-  void CommandAsync(uint64_t tag, std::initializer_list<const char*> words);
+  int CommandAsync(std::initializer_list<const char*> words, uint64_t tag = 0);
 
   EventLoop& loop;
   MessageLog& log;
@@ -142,8 +131,10 @@ struct MpvMediaPlayer::Impl : std::enable_shared_from_this<Impl> {
   std::unique_ptr<Wakeup> wakeup;
   MpvOutputs outputs;
 
-  // The play the engine asked for last: its generation, mpv's playlist entry
-  // for it (-1 until mpv answers), and whether that entry is being played.
+  // The play the engine asked for last: its generation (bumped by every
+  // OpenMedia and Stop; the loadfile command carries it, so that the answer
+  // to a superseded load is known), mpv's playlist entry for it (-1 until
+  // mpv answers), and whether that entry is being played.
   uint64_t generation = 0;
   int64_t entryId = -1;
   bool entryLive = false;
@@ -205,6 +196,9 @@ void MpvMediaPlayer::Impl::Start(const MpvOutputs& wanted) {
       {"load-scripts", "no"},
       {"ytdl", "no"},
       {"osc", "no"},
+      {"load-stats-overlay", "no"},  // each built-in script is a thread with a Lua state
+      {"load-osd-console", "no"},
+      {"load-auto-profiles", "no"},
       {"input-default-bindings", "no"},
       {"input-vo-keyboard", "no"},
       {"osd-level", "0"},
@@ -265,11 +259,10 @@ void MpvMediaPlayer::Impl::SetPropertyAsync(const char* name, const std::string&
   mpv_set_property_async(handle, 0, name, MPV_FORMAT_STRING, &text);
 }
 
-void MpvMediaPlayer::Impl::CommandAsync(uint64_t tag, std::initializer_list<const char*> words) {
+int MpvMediaPlayer::Impl::CommandAsync(std::initializer_list<const char*> words, uint64_t tag) {
   std::vector<const char*> args(words);
   args.push_back(nullptr);
-  int result = mpv_command_async(handle, tag, args.data());
-  if (result < 0 && static_cast<Reply>(tag & 3) == Reply::kLoad) Fail(mpv_error_string(result));
+  return mpv_command_async(handle, tag, args.data());
 }
 
 void MpvMediaPlayer::Impl::Drain() {
@@ -283,7 +276,7 @@ void MpvMediaPlayer::Impl::Drain() {
 void MpvMediaPlayer::Impl::Handle(const mpv_event& event) {
   switch (event.event_id) {
     case MPV_EVENT_COMMAND_REPLY:
-      if (IsTag(event.reply_userdata, Reply::kLoad, generation)) OnLoadReply(event);
+      if (event.reply_userdata == generation) OnLoadReply(event);
       break;
     case MPV_EVENT_START_FILE:
       OnStartFile(static_cast<const mpv_event_start_file*>(event.data)->playlist_entry_id);
@@ -374,7 +367,7 @@ void MpvMediaPlayer::Impl::OnEndFile(const mpv_event_end_file& end) {
       break;
     case MPV_END_FILE_REASON_REDIRECT:
       // A playlist: mpv would go on to its entries on its own.
-      CommandAsync(0, {"stop"});
+      CommandAsync({"stop"});
       Fail("a playlist, not a media file");
       break;
     default:
@@ -497,13 +490,14 @@ void MpvMediaPlayer::OpenMedia(const std::string& path) {
     p.switchedToNull = true;
   }
   p.SetState(kTransitioning);
-  p.CommandAsync(Tag(Reply::kLoad, p.generation), {"loadfile", path.c_str(), "replace"});
+  int result = p.CommandAsync({"loadfile", path.c_str(), "replace"}, p.generation);
+  if (result < 0) p.Fail(mpv_error_string(result));
 }
 
 void MpvMediaPlayer::Stop() {
   Impl& p = *m_impl;
   p.BeginNewPlay();
-  p.CommandAsync(0, {"stop"});
+  p.CommandAsync({"stop"});
   p.SetState(kMediaStopped);
 }
 

@@ -1,4 +1,4 @@
-#include "platform/MpvMediaPlayer.h"
+#include "platform/media/MpvMediaPlayer.h"
 
 #include <gtest/gtest.h>
 
@@ -11,6 +11,7 @@
 #include <string>
 #include <vector>
 
+#include "ports/testing/RecordingMessageLog.h"
 #include "support/Error.h"
 #include "support/testing/TempFolder.h"
 
@@ -50,13 +51,6 @@ std::string ToneWav(double seconds) {
   }
   return bytes;
 }
-
-struct RecordingLog : MessageLog {
-  void LogMessage(int32_t level, const std::string& text, const SequenceIdentity*) override {
-    lines.push_back(std::to_string(level) + " " + text);
-  }
-  std::vector<std::string> lines;
-};
 
 class MpvMediaPlayerTest : public ::testing::Test {
  protected:
@@ -105,7 +99,7 @@ class MpvMediaPlayerTest : public ::testing::Test {
 
   TempFolder folder{"tav-mpv"};
   EventLoop loop;
-  RecordingLog log;
+  RecordingMessageLog log;
   std::unique_ptr<MpvMediaPlayer> player;
   bool insideCall = false;
   std::vector<int32_t> states;

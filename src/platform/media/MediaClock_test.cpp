@@ -1,4 +1,4 @@
-#include "platform/MediaClock.h"
+#include "platform/media/MediaClock.h"
 
 #include <gtest/gtest.h>
 
