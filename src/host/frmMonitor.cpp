@@ -20,7 +20,7 @@ class frmMonitor::RegistryCallback : public CallableByName {
   explicit RegistryCallback(frmMonitor& form) : m_form(form) {}
   void CallByName(const std::string& name) override {
     if (name != "DoUpdateNetworkPrefsFromRegistry") {
-      throw UnknownOperationError("frmMonitor." + name);
+      throw Error(438, "frmMonitor." + name, "Object doesn't support this property or method");
     }
     m_form.DoUpdateNetworkPrefsFromRegistry();
   }

@@ -168,7 +168,8 @@ class Host : public CallableByName {
  public:
   explicit Host(std::function<void()> update) : m_update(std::move(update)) {}
   void CallByName(const std::string& name) override {
-    if (name != "DoUpdateNetworkPrefsFromRegistry") throw UnknownOperationError("Host");
+    if (name != "DoUpdateNetworkPrefsFromRegistry")
+      throw Error(438, "Host", "Object doesn't support this property or method");
     m_update();
   }
 
