@@ -21,6 +21,7 @@
 #include "platform/LockFileOutputClaim.h"
 #include "platform/PlatformPaths.h"
 #include "platform/PosixProcessSpawner.h"
+#include "platform/Realtime.h"
 #include "platform/SystemClock.h"
 #include "platform/TimerfdDeadlineTimer.h"
 #include "platform/UdpDatagramNetwork.h"
@@ -167,6 +168,19 @@ int RunPlayer(const PlayerOptions& options) {
   } catch (const Error& e) {
     Say("the media player cannot start: " + e.Description());
     return kExitShowsNotEnabled;
+  }
+
+  // After the media player has started its threads, so that only the loop
+  // (timers, frames, the engine) runs at real-time priority.
+  if (options.realtimePriority > 0) {
+    std::string refused = RequestRealtimePriority(options.realtimePriority);
+    if (refused.empty()) {
+      relay.LogMessage(1,
+                       "Playing at real-time priority " + std::to_string(options.realtimePriority));
+    } else {
+      relay.LogMessage(2,
+                       "Real-time priority refused (" + refused + "); playing at normal priority");
+    }
   }
 
   HostServices services{

@@ -18,6 +18,7 @@ namespace tav::player {
 // Exit statuses, for the service manager (docs/running.md).
 inline constexpr int kExitEnded = 0;
 inline constexpr int kExitShowsNotEnabled = 1;
+inline constexpr int kExitUsage = 2;
 inline constexpr int kExitAnotherInstance = 3;
 inline constexpr int kExitRestart = 75;
 
@@ -28,6 +29,8 @@ struct PlayerOptions {
   // Which universes (and TAV units) the view shows; "" for every universe
   // of the network preferences.
   std::string viewSpec;
+  // SCHED_FIFO priority for the loop's thread; 0: normal priority.
+  int realtimePriority = 0;
 };
 
 // Runs the player; returns the exit status.

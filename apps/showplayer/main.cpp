@@ -25,5 +25,9 @@ int main(int argc, char** argv) {
     std::printf("showplayer %s\n", TAV_VERSION);
     return 0;
   }
-  return RunPlayer({parsed.commandLine, parsed.view, parsed.viewSpec});
+  if (!parsed.error.empty()) {
+    std::fprintf(stderr, "showplayer: %s\n", parsed.error.c_str());
+    return kExitUsage;
+  }
+  return RunPlayer({parsed.commandLine, parsed.view, parsed.viewSpec, parsed.realtimePriority});
 }

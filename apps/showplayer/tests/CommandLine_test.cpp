@@ -34,6 +34,18 @@ TEST(PlayerCommandLine, OwnOptionsAreTakenOutAndTheRestIsJoinedWithOneBlank) {
   EXPECT_TRUE(ParsePlayerCommandLine({"--version"}).version);
 }
 
+TEST(PlayerCommandLine, RealtimeTakesAPriorityFromOneTo99) {
+  EXPECT_EQ(ParsePlayerCommandLine({"--realtime"}).realtimePriority, kDefaultRealtimePriority);
+  EXPECT_EQ(ParsePlayerCommandLine({"--realtime=50", "/noschedule"}).realtimePriority, 50);
+  EXPECT_EQ(ParsePlayerCommandLine({"--realtime=50", "/noschedule"}).commandLine, "/noschedule");
+  for (const char* bad :
+       {"--realtime=0", "--realtime=100", "--realtime=x", "--realtime=5x", "--realtime="}) {
+    PlayerCommandLine parsed = ParsePlayerCommandLine({bad});
+    EXPECT_EQ(parsed.realtimePriority, 0) << bad;
+    EXPECT_NE(parsed.error.find("1 to 99"), std::string::npos) << bad;
+  }
+}
+
 TEST(ConsoleLog, OneLinePerLogLineWithDateLevelAndText) {
   DateTime at = DateTime::FromParts(2024, 12, 24, 18, 0, 5);
   EXPECT_EQ(FormatConsoleLine(1, at, "Starting show: demo.show"),
