@@ -35,6 +35,8 @@
 namespace tav::showctl {
 namespace {
 
+constexpr uint32_t kPumpMs = 50;
+
 struct PlayOptions {
   std::string file;
   bool loop = false;
@@ -200,16 +202,25 @@ int Play(const PlayOptions& o, const std::string& folder) {
       stopping = true;
       sequence->StopPlay();
     }
+    // At most 50 ms at a time, as the show engine's pump: a sequence that
+    // cannot be read as fast as it plays must not hold the loop (or pile
+    // frames up) for ever.
     PlayEvent event;
     bool any = false;
     uint32_t last = 0;
+    uint32_t began = clock->TickCount();
+    bool more = false;
     while (sequence->GetEvent(event)) {
       Dispatch(control, event);
       any = true;
       last = event.dueTick;
+      if (clock->TickCount() - began > kPumpMs) {
+        more = true;
+        break;
+      }
     }
     if (any) control.SendAccumulated(last);
-    int64_t in = sequence->NextEventIn();
+    int64_t in = more ? 0 : sequence->NextEventIn();
     if (in < 0) {
       loop.Stop();
       return;
