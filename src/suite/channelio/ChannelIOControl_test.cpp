@@ -621,3 +621,96 @@ TEST_F(Control, SerialNetworksWithoutATransmitterKeepTheirLevels) {
 
 }  // namespace
 }  // namespace tav
+
+namespace tav {
+namespace {
+
+// A serial transmitter that records the frames it is handed.
+class FakeSerialOutput : public NetworkOutput {
+ public:
+  FakeSerialOutput(std::string name, std::vector<std::string>& journal)
+      : m_name(std::move(name)), m_journal(journal) {
+    m_journal.push_back("open " + m_name);
+  }
+  std::string Name() const override { return m_name; }
+  void Send(const OutputFrame& frame) override {
+    if (frame.newFrame) m_journal.push_back(m_name + " frame at " + std::to_string(frame.now));
+  }
+  std::optional<uint32_t> NextRefresh() const override { return std::nullopt; }
+  void Close() override { m_journal.push_back("close " + m_name); }
+  OutputCounters Counters() const override { return {}; }
+
+ private:
+  std::string m_name;
+  std::vector<std::string>& m_journal;
+};
+
+class FakeSerialFactory : public SerialOutputFactory {
+ public:
+  std::unique_ptr<NetworkOutput> OpenTAVNetwork(int32_t network, const TAVNetworkPreferences& p,
+                                                LevelBuffers&) override {
+    if (p.Port() == "/dev/busy")
+      throw Error(kErrorPortAlreadyOpen, "Serial.Open", "the port is already open");
+    return std::make_unique<FakeSerialOutput>(
+        "TAV " + std::to_string(network) + " at " + std::to_string(p.Speed()), journal);
+  }
+  std::unique_ptr<NetworkOutput> OpenX10(const std::string& port, const NetworkPreferences&,
+                                         LevelBuffers&) override {
+    return std::make_unique<FakeSerialOutput>("X10 " + port, journal);
+  }
+  std::unique_ptr<NetworkOutput> OpenFennick(const std::string& port, const FennickPreferences&,
+                                             LevelBuffers&) override {
+    return std::make_unique<FakeSerialOutput>("Fennick " + port, journal);
+  }
+  std::unique_ptr<NetworkOutput> OpenDMXWidget(const DMXUniversePrefs& p, LevelBuffers&) override {
+    return std::make_unique<FakeSerialOutput>("widget " + p.Port(), journal);
+  }
+  std::vector<std::string> journal;
+};
+
+class Serial : public Control {
+ protected:
+  Serial() {
+    ChannelIOPorts ports = Ports();
+    ports.serial = &factory;
+    serial = std::make_unique<ChannelIOControl>(ports);
+  }
+  FakeSerialFactory factory;
+  std::unique_ptr<ChannelIOControl> serial;
+};
+
+TEST_F(Serial, SerialNetworksAreOutputsOfTheSameFrames) {
+  NetworkPreferences prefs = Prefs({});
+  DMXUniversePrefs widget;
+  widget.SetUniverse(4);
+  widget.SetTransport(DMXTransport::kUSBPro);
+  widget.SetPort("/dev/ttyUSB3");
+  prefs.AddDMXUniverse(widget);
+  serial->ApplyNetworkPreferences(prefs);
+  serial->SetTAVNetworkSpeed(0, 19200);
+  serial->SetTAVNetworkPort(0, "/dev/ttyS0");
+  serial->OpenX10Network("/dev/ttyS1");
+  serial->SetupClient(true, "Show Player", true);
+  serial->OutputEffect(kFamilyX10, 1, 0, 1, "", kEffectSet, 0, 100, 100, 0, 1025);
+  serial->SendAccumulated(1025);
+  timer.RunUntil(1025);
+  EXPECT_THAT(factory.journal,
+              ElementsAre("open widget /dev/ttyUSB3", "open TAV 1 at 19200", "open X10 /dev/ttyS1",
+                          "widget /dev/ttyUSB3 frame at 1025", "TAV 1 at 19200 frame at 1025",
+                          "X10 /dev/ttyS1 frame at 1025"));
+  factory.journal.clear();
+  serial->ApplyNetworkPreferences(prefs);  // nothing changed: nothing reopens
+  EXPECT_THAT(factory.journal, IsEmpty());
+  serial->ReleaseClient();
+  EXPECT_THAT(factory.journal, ElementsAre("close TAV 1 at 19200", "close widget /dev/ttyUSB3",
+                                           "close X10 /dev/ttyS1"));
+}
+
+TEST_F(Serial, APortHeldElsewhereFailsWith8005) {
+  auto failure = testing::FailureOf([&] { serial->SetTAVNetworkPort(2, "/dev/busy"); });
+  EXPECT_EQ(failure.number, kErrorPortAlreadyOpen);
+  EXPECT_EQ(serial->OutputCount(), 0u);
+}
+
+}  // namespace
+}  // namespace tav
