@@ -81,6 +81,7 @@ void TimerfdDeadlineTimer::SetDeadline(uint32_t tick) {
 }
 
 void TimerfdDeadlineTimer::Cancel() {
+  if (!m_core->armed) return;
   itimerspec spec{};
   ::timerfd_settime(m_core->descriptor.native_handle(), 0, &spec, nullptr);
   m_core->armed = false;
