@@ -6,6 +6,8 @@
 
 #include <sys/stat.h>
 
+#include <cstdint>
+
 #include <string>
 #include <string_view>
 
@@ -38,6 +40,31 @@ class FileDescriptor {
 // `written`, when given, receives the status of the new file.
 int ReplaceFileContents(const std::string& path, std::string_view bytes,
                         struct stat* written = nullptr);
+
+// The same replacement for a file written piece by piece: a temporary file
+// beside `path` that takes the bytes, and Commit flushes it and renames it
+// over the file. Given up (destroyed without a successful Commit), the
+// temporary is removed and the file at `path` is as it was. Each call
+// returns 0 or the errno of the step that failed.
+class ReplacementFile {
+ public:
+  ReplacementFile() = default;
+  ~ReplacementFile();
+  ReplacementFile(const ReplacementFile&) = delete;
+  ReplacementFile& operator=(const ReplacementFile&) = delete;
+
+  int Open(const std::string& path);
+  int Append(std::string_view bytes);
+  // Over bytes appended before (a header whose sizes are known at the end).
+  int WriteAt(uint64_t offset, std::string_view bytes);
+  int Commit(struct stat* written = nullptr);
+
+ private:
+  std::string m_path;
+  std::string m_temporary;
+  int m_fd = -1;
+  bool m_committed = false;
+};
 
 // The folder part of a path: "." for a bare name, "/" for the root.
 std::string FolderOf(const std::string& path);

@@ -6,9 +6,13 @@
 #include <string>
 #include <string_view>
 
+#include "suite/seqlib/RandomAccessFile.h"
+
 namespace tav {
 
 uint64_t ContentHash(std::string_view bytes);
+// The same of a whole file, read a piece at a time.
+uint64_t ContentHash(const RandomAccessFile& file);
 // Sixteen lower-case hexadecimal digits.
 std::string ContentHashText(uint64_t hash);
 

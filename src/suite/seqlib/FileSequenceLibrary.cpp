@@ -4,6 +4,7 @@
 
 #include "suite/seqlib/CompiledEventStream.h"
 #include "suite/seqlib/CompressedSequence.h"
+#include "suite/seqlib/CompressedSequenceReader.h"
 #include "suite/seqlib/ContentHash.h"
 #include "suite/seqlib/FseqConversion.h"
 #include "suite/seqlib/FseqEventStream.h"
@@ -143,7 +144,8 @@ struct FileSequenceLibrary::Core {
     info.families = FamiliesOf(*compiled);
     info.channelCount = compiled->channels.size();
     info.effectCount = compiled->effects.size();
-    info.frameCount = compiled->FrameCount();
+    info.frameCount = compiled->TimelineFrameCount();
+    info.levelBlockCount = compiled->LevelBlockCount();
     info.sourceHash = compiled->sourceHash;
     content->compiled = compiled;
     content->openStream = [compiled] { return std::make_unique<CompiledEventStream>(compiled); };
@@ -169,6 +171,8 @@ struct FileSequenceLibrary::Core {
         for (const auto& range : fseq.Ranges()) channels += range.count;
         info.channelCount = channels;
         info.frameCount = fseq.FrameCount();
+        info.levelBlockCount =
+            static_cast<size_t>(fseq.FrameCount()) * FseqSegments(fseq, universes).size();
         UniverseMap map = universes;
         content->openStream = [shared, map] {
           return std::make_unique<FseqEventStream>(std::make_unique<FseqFile>(shared), map);
@@ -257,6 +261,35 @@ std::shared_ptr<const CompiledSequence> FileSequenceLibrary::LoadCompiled(
     const std::string& path, const std::function<void()>& keepAlive) const {
   std::vector<std::string> including;
   return m_core->LoadCompiled(path, keepAlive, including);
+}
+
+std::string FileSequenceLibrary::FormatOf(const std::string& path) const {
+  switch (m_core->Detect(*m_core->Open(path))) {
+    case Format::Fseq:
+      return "fseq";
+    case Format::Compressed:
+      return "tcs";
+    case Format::Plain:
+    default:
+      return "plain";
+  }
+}
+
+std::unique_ptr<StreamedSequence> FileSequenceLibrary::OpenStreamed(const std::string& path,
+                                                                    bool hashFseq) const {
+  std::shared_ptr<RandomAccessFile> file = m_core->Open(path);
+  switch (m_core->Detect(*file)) {
+    case Format::Fseq: {
+      uint64_t hash = hashFseq ? ContentHash(*file) : 0;
+      return std::make_unique<FseqStreamedSequence>(std::make_unique<FseqFile>(file),
+                                                    m_core->universes, hash);
+    }
+    case Format::Compressed:
+      return std::make_unique<CompressedSequenceReader>(file);
+    case Format::Plain:
+    default:
+      return std::make_unique<CompiledStreamedSequence>(LoadCompiled(path));
+  }
 }
 
 }  // namespace tav
