@@ -123,6 +123,7 @@ void InspectExport(const CompressedSequenceReader& reader) {
 
 void InspectPlain(const FileSequenceLibrary& library, const std::string& path) {
   auto content = library.LoadContent(path);
+  Line("File", path);
   const CompiledSequence& compiled = *content->compiled;
   Line("Format", "plain sequence (JSON)");
   Line("Length", Duration(compiled.lengthMs));
@@ -142,13 +143,13 @@ void InspectPlain(const FileSequenceLibrary& library, const std::string& path) {
 
 void Inspect(const SequenceOptions& o) {
   auto library = MakeSequenceLibrary(o);
-  std::string format = library->FormatOf(o.file);
-  Line("File", o.file);
-  if (format == "plain") {
+  if (library->FormatOf(o.file) == "plain") {
     InspectPlain(*library, o.file);
     return;
   }
+  // Opened before anything is printed, so a damaged header gives one line.
   auto stream = library->OpenStreamed(o.file);
+  Line("File", o.file);
   if (auto* fseq = dynamic_cast<FseqStreamedSequence*>(stream.get())) {
     InspectFseq(*fseq);
   } else {

@@ -24,7 +24,7 @@ class Progress {
  public:
   Progress(bool shown, size_t total) : m_shown(shown), m_total(total) {}
   ~Progress() {
-    if (m_printed) std::fprintf(stderr, m_terminal ? "\r\033[K" : "\n");
+    if (m_printed && m_terminal) std::fprintf(stderr, "\r\033[K");
   }
   void Update(size_t done) {
     if (!m_shown || m_total == 0) return;
@@ -48,6 +48,16 @@ class Progress {
 // Files with fewer frames than this end before a progress line helps.
 constexpr size_t kProgressFrames = 2000;
 
+// The reader's words without the error's kind and the file name, which the
+// line says already.
+std::string Reason(const tav::Error& e, const std::string& file) {
+  std::string text = e.Description();
+  for (const std::string& prefix : {std::string("Invalid file format: "), file + ": "}) {
+    if (text.compare(0, prefix.size(), prefix) == 0) text.erase(0, prefix.size());
+  }
+  return text;
+}
+
 std::string Megabytes(uint64_t bytes) {
   return fmt::format("{:.1f} MB", bytes / 1e6);
 }
@@ -64,7 +74,7 @@ void Verify(const SequenceOptions& o) {
           "{}: OK (plain sequence: {} effects, {} frames; every subsequence found and read)\n",
           o.file, compiled->effects.size(), compiled->TimelineFrameCount());
     } catch (const tav::Error& e) {
-      throw CommandFailed(fmt::format("{}: damaged: {}", o.file, e.Description()));
+      throw CommandFailed(fmt::format("{}: damaged: {}", o.file, Reason(e, o.file)));
     }
     return;
   }
@@ -86,7 +96,7 @@ void Verify(const SequenceOptions& o) {
         stream->Groups().size() > 1
             ? fmt::format("frame {} of track group {}", stream->FrameIndex(), stream->GroupIndex())
             : fmt::format("frame {} of {}", stream->FrameIndex(), total);
-    throw CommandFailed(fmt::format("{}: damaged at {}: {}", o.file, where, e.Description()));
+    throw CommandFailed(fmt::format("{}: damaged at {}: {}", o.file, where, Reason(e, o.file)));
   }
   std::string what = format == "fseq" ? "FSEQ file" : "compressed export";
   std::cout << fmt::format("{}: OK ({}: every frame read, {} frames, {} of levels)\n", o.file, what,

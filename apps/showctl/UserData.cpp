@@ -1,5 +1,9 @@
 #include "UserData.h"
 
+#include <iostream>
+#include <optional>
+#include <set>
+
 #include "config/Settings.h"
 #include "platform/FileRegistryStore.h"
 #include "platform/PlatformPaths.h"
@@ -7,9 +11,18 @@
 namespace tav::showctl {
 
 std::string UserDataFolder() {
-  FileRegistryStore store(RegistryFilePath());
-  Settings settings(store, SystemPathDefaults());
-  return settings.UserDataPath();
+  static std::optional<std::string> folder;
+  if (!folder) {
+    FileRegistryStore store(RegistryFilePath(), ReportSettingsProblem);
+    Settings settings(store, SystemPathDefaults());
+    folder = settings.UserDataPath();
+  }
+  return *folder;
+}
+
+void ReportSettingsProblem(const std::string& problem) {
+  static std::set<std::string> reported;
+  if (reported.insert(problem).second) std::cerr << "showctl: warning: " << problem << "\n";
 }
 
 }  // namespace tav::showctl

@@ -14,6 +14,7 @@
 #include <sstream>
 
 #include "CommandRegistry.h"
+#include "UserData.h"
 #include "config/LibRegistry.h"
 #include "config/RegistryFileFormat.h"
 #include "config/Settings.h"
@@ -40,9 +41,7 @@ std::string SettingsFile(const SettingsOptions& o) {
 }
 
 FileRegistryStore OpenStore(const SettingsOptions& o) {
-  return FileRegistryStore(SettingsFile(o), [](const std::string& problem) {
-    std::cerr << "showctl: warning: " << problem << "\n";
-  });
+  return FileRegistryStore(SettingsFile(o), ReportSettingsProblem);
 }
 
 const SettingDescription* FindKnown(const std::string& name,

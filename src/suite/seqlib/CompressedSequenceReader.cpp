@@ -101,32 +101,35 @@ void CompressedSequenceReader::Inflate(uint8_t* out, uint64_t expected, const st
   m_chunk.resize(kChunkBytes);
   ZSTD_outBuffer output{out, static_cast<size_t>(expected), 0};
   const uint64_t size = m_file->Size();
+  const uint64_t start = m_offset;
   auto damaged = [&](const std::string& why) {
     return seqerrors::InvalidFormat(
-        kReadSource, m_name + ": " + what + " (at byte " + std::to_string(m_offset) + ") " + why);
+        kReadSource, m_name + ": " + what + " at byte " + std::to_string(start) + ": " + why);
   };
   for (;;) {
     size_t want = static_cast<size_t>(std::min<uint64_t>(kChunkBytes, size - m_offset));
-    if (want == 0) throw damaged("is cut short by the end of the file");
+    if (want == 0) throw damaged("cut short by the end of the file");
     size_t got = m_file->ReadAt(m_offset, m_chunk.data(), want);
-    if (got == 0) throw damaged("is cut short by the end of the file");
+    if (got == 0) throw damaged("cut short by the end of the file");
     ZSTD_inBuffer input{m_chunk.data(), got, 0};
     size_t rc = 1;
     while (input.pos < input.size && rc != 0) {
       size_t before = input.pos + output.pos;
       rc = ZSTD_decompressStream(ctx, &output, &input);
-      if (ZSTD_isError(rc)) throw damaged(std::string("is damaged: ") + ZSTD_getErrorName(rc));
+      if (ZSTD_isError(rc)) {
+        throw damaged(std::string("damaged data (zstd: ") + ZSTD_getErrorName(rc) + ")");
+      }
       if (rc != 0 && input.pos + output.pos == before) {
         // Stuck with the output full: the frame holds more than it should.
-        throw damaged("holds more than the " + std::to_string(expected) + " bytes it should");
+        throw damaged("more data than the " + std::to_string(expected) + " bytes it should hold");
       }
     }
     m_offset += input.pos;
     if (rc == 0) break;
   }
   if (output.pos != expected) {
-    throw damaged("holds " + std::to_string(output.pos) + " bytes, " + std::to_string(expected) +
-                  " expected");
+    throw damaged(std::to_string(output.pos) + " bytes where " + std::to_string(expected) +
+                  " belong");
   }
 }
 

@@ -77,18 +77,22 @@ std::string EncodeHead(const CompiledSequence& s, const std::vector<TrackGroup>&
 }  // namespace
 
 struct CompressedSequenceWriter::Context {
-  ZSTD_CCtx* ctx = ZSTD_createCCtx();
+  explicit Context(int level) {
+    ZSTD_CCtx_setParameter(ctx, ZSTD_c_compressionLevel, level);
+    // A checksum per block, so that verifying finds damage in any byte.
+    ZSTD_CCtx_setParameter(ctx, ZSTD_c_checksumFlag, 1);
+  }
   ~Context() { ZSTD_freeCCtx(ctx); }
+  ZSTD_CCtx* ctx = ZSTD_createCCtx();
 };
 
 CompressedSequenceWriter::CompressedSequenceWriter(WritableFile& out, const CompiledSequence& head,
                                                    std::vector<TrackGroup> groups, int level)
     : m_out(out),
       m_groups(std::move(groups)),
-      m_level(level),
       m_sourceHash(head.sourceHash),
       m_families(FamilyMask(head, m_groups)),
-      m_context(std::make_unique<Context>()) {
+      m_context(std::make_unique<Context>(level)) {
   for (const auto& group : m_groups) {
     size_t frameBytes = group.FrameBytes();
     if (group.tracks.empty() || frameBytes == 0 || frameBytes > TrackGroup::kMaxFrameBytes ||
@@ -119,8 +123,8 @@ void CompressedSequenceWriter::SkipEmptyGroups() {
 
 void CompressedSequenceWriter::AppendCompressed(const void* bytes, size_t size) {
   m_compressed.resize(ZSTD_compressBound(size));
-  size_t written = ZSTD_compressCCtx(m_context->ctx, m_compressed.data(), m_compressed.size(),
-                                     bytes, size, m_level);
+  size_t written =
+      ZSTD_compress2(m_context->ctx, m_compressed.data(), m_compressed.size(), bytes, size);
   if (ZSTD_isError(written)) {
     throw seqerrors::FileAccess(kWriteSource, ZSTD_getErrorName(written));
   }

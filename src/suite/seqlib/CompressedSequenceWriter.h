@@ -43,7 +43,6 @@ class CompressedSequenceWriter {
   WritableFile& m_out;
   std::vector<TrackGroup> m_groups;
   std::vector<uint32_t> m_framesPerBlock;
-  int m_level;
   uint64_t m_sourceHash;
   uint32_t m_families;
   uint64_t m_uncompressed = 0;
