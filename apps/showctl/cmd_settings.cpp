@@ -289,18 +289,18 @@ void Register(CLI::App& app) {
   import->add_option("file", o->path, "Export file to read, - for standard input")->required();
   import->add_flag("--skip-bad-lines", o->skipBadLines,
                    "Import the readable lines even if others cannot be read");
-  import->callback([o] { Import(*o);
-});
+  import->callback([o] { Import(*o); });
 
-auto* exportCmd = settings->add_subcommand(
-    "export", "Write the settings as a registry export file (to standard output by default)");
-exportCmd->add_option("file", o->path, "File to write, - for standard output");
-exportCmd->add_flag("--utf16", o->utf16,
-                    "Write UTF-16 with a byte-order mark, as Windows' registry editor expects");
-exportCmd->callback([o] { Export(*o); });
+  auto* exportCmd = settings->add_subcommand(
+      "export", "Write the settings as a registry export file (to standard output by default)");
+  exportCmd->add_option("file", o->path, "File to write, - for standard output");
+  exportCmd->add_flag("--utf16", o->utf16,
+                      "Write UTF-16 with a byte-order mark, as Windows' registry editor expects");
+  exportCmd->callback([o] { Export(*o); });
+}
+
 }  // namespace
 
-CommandGroup reg{"settings", Register};
+static CommandGroup reg{"settings", Register};
 
-}  // namespace tav::showctl
 }  // namespace tav::showctl
