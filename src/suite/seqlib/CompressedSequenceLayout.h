@@ -22,6 +22,10 @@ constexpr uint64_t kMaxHeadBytes = 1ull << 31;
 // kTargetBlockBytes, or one frame when a frame is larger.
 constexpr uint64_t kMaxBlockBytes = 64ull << 20;
 constexpr size_t kTargetBlockBytes = 1 << 20;
+// zstd turns at most 128 KiB out of a block that costs at least 4 bytes (a
+// block header and one byte repeated), so compressed bytes can hold at most
+// this many times their size: the bound for levels a head may promise.
+constexpr uint64_t kMaxExpansion = (128 * 1024) / 4;
 // at, channel, duration, type, start, end, priority: 8 + 4 + 4 + 1 + 1 + 1 + 4.
 constexpr size_t kEffectBytes = 23;
 constexpr int64_t kMaxTime = int64_t{1} << 40;

@@ -44,6 +44,21 @@ CompressedSequenceReader::CompressedSequenceReader(std::shared_ptr<const RandomA
   std::unique_ptr<char[]> head(new char[size > 0 ? size : 1]);
   Inflate(reinterpret_cast<uint8_t*>(head.get()), size, "the head");
   ParseHead(head.get(), size);
+  // What the groups promise must fit into what is left of the file, so that
+  // nobody reserves room for levels a damaged head only claims.
+  uint64_t promised = 0;
+  for (const auto& group : m_groups) {
+    // At most 2^32 frames of 2^24 bytes each; saturate rather than wrap.
+    promised =
+        std::min<uint64_t>(promised + uint64_t{group.frameCount} * group.FrameBytes(), 1ull << 62);
+  }
+  uint64_t left = m_file->Size() - m_offset;
+  if (promised / tcs::kMaxExpansion > left) {
+    throw seqerrors::InvalidFormat(
+        kReadSource, m_name + ": the track groups promise " + std::to_string(promised) +
+                         " bytes of levels, more than the " + std::to_string(left) +
+                         " bytes after the head can hold");
+  }
   bool anyBlock = false;
   for (size_t g = 0; g < m_groups.size(); ++g) anyBlock |= m_groups[g].frameCount > 0;
   if (!anyBlock) CheckNothingFollows();

@@ -34,10 +34,6 @@ SequenceData FseqToSequenceData(FseqFile& file, const UniverseMap& map,
   return data;
 }
 
-}  // namespace tav
-
-namespace tav {
-
 FseqStreamedSequence::FseqStreamedSequence(std::unique_ptr<FseqFile> file, const UniverseMap& map,
                                            uint64_t sourceHash)
     : m_file(std::move(file)), m_segments(FseqSegments(*m_file, map)) {

@@ -14,6 +14,7 @@
 #include "suite/seqlib/PlainSequence.h"
 #include "suite/seqlib/PlainSequenceWriter.h"
 #include "suite/seqlib/PlayEvent.h"
+#include "suite/seqlib/SequenceSummary.h"
 #include "support/testing/Failure.h"
 
 namespace tav {
@@ -38,6 +39,12 @@ class CountingFile : public RandomAccessFile {
   MemoryFile m_file;
   mutable uint64_t m_read = 0;
 };
+
+// Sets the header's count of bytes after it to what the file holds.
+void KeepHeaderSizeRight(std::string& bytes) {
+  uint64_t after = bytes.size() - kCompressedHeaderBytes;
+  for (int i = 0; i < 8; ++i) bytes[24 + i] = static_cast<char>(after >> (8 * i));
+}
 
 LevelTrack Track(int32_t family, int32_t network, int32_t first, int32_t count, int64_t start,
                  int32_t step, uint32_t frames, uint8_t seed) {
@@ -103,6 +110,22 @@ TEST(TrackGroup, TimelineFramesCountEachMomentOnce) {
   EXPECT_EQ(TimelineFrameAt(alike, 125), 2);
 }
 
+TEST(SequenceSummary, CountsEveryAddressOnceAndFramesOnTheTimeline) {
+  CompiledSequence s = Sample(10);
+  // A DMX effect channel inside a track's slots, and one beside them.
+  s.channels.push_back({{kFamilyDMX, 1, 0, 5}, "inside"});
+  s.channels.push_back({{kFamilyDMX, 9, 0, 5}, "beside"});
+  SequenceSummary summary = Summarize(s, GroupTracks(s.tracks));
+  EXPECT_EQ(summary.effectCount, 2u);
+  EXPECT_EQ(summary.frameTracks, 4u);
+  EXPECT_EQ(summary.levelBlocks, 3u * 10 + 7);
+  EXPECT_EQ(summary.timelineFrames, 10u + 7);  // 0-225 by 25, 1000-1600 by 100
+  EXPECT_EQ(summary.stepMs, 0);
+  EXPECT_EQ(summary.addressesPerFamily[kFamilyDMX], 512u + 300 + 20 + 1);
+  EXPECT_EQ(summary.addressesPerFamily[kFamilyTAV], 4u + 1);
+  EXPECT_EQ(summary.dmxUniverses, (std::set<int32_t>{1, 2, 3, 9}));
+}
+
 TEST(CompressedExport, GroupsAndBlocksReadBackTrackForTrack) {
   CompiledSequence s = Sample(3000);
   std::string bytes = WriteCompressedSequence(s);
@@ -159,9 +182,7 @@ TEST(CompressedExport, DamageNamesTheFramesOfTheBlock) {
 
   auto stray = FailureOf([&] {
     std::string longer = bytes + "x";
-    // Keep the header's size right so only the stray byte is wrong.
-    uint64_t compressed = longer.size() - kCompressedHeaderBytes;
-    for (int i = 0; i < 8; ++i) longer[24 + i] = static_cast<char>(compressed >> (8 * i));
+    KeepHeaderSizeRight(longer);  // so that only the stray byte is wrong
     CompressedSequenceReader r(std::make_shared<MemoryFile>(longer, "x.tcs"));
     ReadWhole(r);
   });
@@ -181,6 +202,26 @@ TEST(CompressedExport, OlderAndNewerVersionsAreRefusedAndCountAsOutOfDate) {
     EXPECT_FALSE(ReadCompressedSourceHash(other.substr(0, 40)).has_value());
   }
   EXPECT_EQ(ReadCompressedSourceHash(bytes.substr(0, 40)), 42u);
+}
+
+TEST(CompressedExport, AHeadPromisingMoreLevelsThanTheFileCanHoldIsRefused) {
+  CompiledSequence s;
+  s.tracks.push_back(Track(kFamilyDMX, 1, 1, 512, 0, 25, 2, 0));
+  std::string bytes = WriteCompressedSequence(s);
+  // Rewrite the head with a frame count of 4 billion.
+  CompressedSequenceReader reader(std::make_shared<MemoryFile>(bytes, "a.tcs"));
+  CompiledSequence head = reader.Head();
+  std::vector<TrackGroup> groups = reader.Groups();
+  groups[0].frameCount = 4000000000u;
+  MemoryWritableFile out;
+  CompressedSequenceWriter writer(out, head, groups);
+  std::string forged =
+      bytes.substr(0, 40) + out.Bytes().substr(40) + bytes.substr(reader.Position());
+  KeepHeaderSizeRight(forged);
+  auto failure = FailureOf(
+      [&] { CompressedSequenceReader(std::make_shared<MemoryFile>(forged, "forged.tcs")); });
+  EXPECT_NE(failure.description.find("promise 2048000000000 bytes of levels"), std::string::npos)
+      << failure.description;
 }
 
 TEST(CompressedExport, WriterRefusesTooFewOrTooManyFrames) {
