@@ -133,13 +133,6 @@ class LocalFileSystemImpl : public FileSystem {
 
 }  // namespace
 
-std::string FileSystem::ReadAll(const std::string& path) const {
-  auto file = OpenForRead(path);
-  std::string bytes(file->Size(), '\0');
-  ReadExactly(*file, 0, bytes.data(), bytes.size(), "FileSystem.ReadAll", "the whole file");
-  return bytes;
-}
-
 std::shared_ptr<FileSystem> LocalFileSystem() {
   return std::make_shared<LocalFileSystemImpl>();
 }
