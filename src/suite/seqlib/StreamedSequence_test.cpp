@@ -240,6 +240,30 @@ TEST(CompressedExport, WriterRefusesTooFewOrTooManyFrames) {
   EXPECT_EQ(ReadCompressedSequence(empty.Bytes(), "empty.tcs"), none);
 }
 
+TEST(PlainStream, WritesEachGroupAsItComesAndReadsBackTheSameTracks) {
+  CompiledSequence s = Sample(5);
+  s.tracks.push_back(Track(kFamilyTAV, 2, 1, 3, 40, 10, 0, 9));  // a track of no frames
+  s.subsequences.clear();
+  auto shared = std::make_shared<const CompiledSequence>(s);
+  CompiledStreamedSequence source(shared);
+  MemoryWritableFile out;
+  WritePlainSequence(source, out);
+  SequenceData back = ParsePlainSequence(out.Bytes(), "p.tseq");
+  EXPECT_EQ(back.tracks, s.tracks);
+  EXPECT_EQ(Compile(back, {}).effects, s.effects);
+  EXPECT_EQ(back.media, "song.mp3");
+  // Four frame entries: the two DMX tracks share one.
+  size_t entries = 0;
+  for (size_t at = out.Bytes().find("\"step_ms\""); at != std::string::npos;
+       at = out.Bytes().find("\"step_ms\"", at + 1)) {
+    ++entries;
+  }
+  EXPECT_EQ(entries, 4u);
+
+  PlainSequenceWriter writer(out, {}, GroupTracks(s.tracks));
+  EXPECT_NE(FailureOf([&] { writer.Finish(); }).number, 0);  // frames still to come
+}
+
 // A sparse FSEQ file of 3 universe pieces, frame f channel c = f * 3 + c.
 std::string SparseFseq(uint32_t frames) {
   FseqWriter::Options options;
