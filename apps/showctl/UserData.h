@@ -11,8 +11,4 @@ namespace tav::showctl {
 // Ends with '/'. Read once per run.
 std::string UserDataFolder();
 
-// Prints a problem of the settings file as a warning on standard error,
-// once per run however many times the file is read.
-void ReportSettingsProblem(const std::string& problem);
-
 }  // namespace tav::showctl
