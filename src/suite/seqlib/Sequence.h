@@ -33,7 +33,8 @@ struct SequenceInfo {
   std::vector<int32_t> families;  // in ascending order
   size_t channelCount = 0;        // effect channels, or FSEQ channels
   size_t effectCount = 0;
-  size_t frameCount = 0;  // FSEQ frames, or frames over all tracks
+  size_t frameCount = 0;       // frames of the timeline
+  size_t levelBlockCount = 0;  // level blocks over all tracks and frames
   uint64_t sourceHash = 0;
 };
 
