@@ -10,6 +10,7 @@
 #include "config/MemoryRegistryStore.h"
 #include "ports/testing/VirtualTimerService.h"
 #include "show/TriggerFunctions.h"
+#include "show/testing/RecordingLog.h"
 #include "show/testing/ShowRig.h"
 #include "suite/channelio/testing/RecordingChannelIO.h"
 
@@ -18,14 +19,6 @@ namespace {
 
 using ::testing::ElementsAre;
 using ::testing::IsEmpty;
-
-class Lines : public MessageLog {
- public:
-  void LogMessage(int32_t level, const std::string& szText, const SequenceIdentity*) override {
-    lines.push_back(std::to_string(level) + " " + szText);
-  }
-  std::vector<std::string> lines;
-};
 
 // The four settings of every TAV network, in order, as the control records
 // them.
@@ -64,7 +57,7 @@ class NetworkTest : public ::testing::Test {
 
   MemoryRegistryStore store;
   RecordingChannelIO cio;
-  Lines log;
+  RecordingLog log;
   std::unique_ptr<NetworkStartup> networks;
 };
 
