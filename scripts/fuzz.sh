@@ -1,12 +1,21 @@
 #!/usr/bin/env bash
 # Builds the libFuzzer targets with clang and runs each for a bounded time.
-# FUZZ_SECONDS (default 60) per target. Fails on the first crash, sanitizer
-# report or hang; the reproducer is left in build/fuzz/artifacts/.
+# The targets share a fixed budget, FUZZ_TOTAL_SECONDS (default 480), split
+# evenly, so adding a target does not lengthen the test command;
+# FUZZ_SECONDS sets the time per target instead. Fails on the first crash,
+# sanitizer report or hang; the reproducer is left in build/fuzz/artifacts/.
 set -euo pipefail
 cd "$(dirname "$0")/.."
-seconds=${FUZZ_SECONDS:-60}
 cmake --preset fuzz >/dev/null
 cmake --build build/fuzz -j "$(nproc)"
+targets=$(ls build/fuzz/fuzz/fuzz_* 2>/dev/null | wc -l)
+if [ -n "${FUZZ_SECONDS:-}" ]; then
+  seconds=$FUZZ_SECONDS
+else
+  total=${FUZZ_TOTAL_SECONDS:-480}
+  seconds=$(( targets > 0 ? total / targets : total ))
+  [ "$seconds" -ge 10 ] || seconds=10
+fi
 mkdir -p build/fuzz/artifacts
 status=0
 for target in build/fuzz/fuzz/fuzz_*; do

@@ -6,6 +6,7 @@
 
 #include <fmt/format.h>
 
+#include <chrono>
 #include <cstdio>
 #include <fstream>
 #include <iostream>
@@ -13,13 +14,13 @@
 #include <optional>
 #include <sstream>
 
+#include "ArgumentValues.h"
 #include "CommandRegistry.h"
+#include "SettingsStore.h"
 #include "config/LibRegistry.h"
 #include "config/RegistryFileFormat.h"
 #include "config/Settings.h"
 #include "platform/FileRegistryStore.h"
-#include "platform/PlatformPaths.h"
-#include "support/Numbers.h"
 
 namespace tav::showctl {
 namespace {
@@ -35,14 +36,18 @@ struct SettingsOptions {
   bool skipBadLines = false;
 };
 
-std::string SettingsFile(const SettingsOptions& o) {
-  return o.file.empty() ? RegistryFilePath() : o.file;
+FileRegistryStore OpenStore(const SettingsOptions& o) {
+  return OpenSettingsStore(o.file);
 }
 
-FileRegistryStore OpenStore(const SettingsOptions& o) {
-  return FileRegistryStore(SettingsFile(o), [](const std::string& problem) {
-    std::cerr << "showctl: warning: " << problem << "\n";
-  });
+// The store never waits for another program's lock; a command that ends
+// right after writing waits a little here, and reports a change it could
+// not write rather than success.
+void FinishWriting(FileRegistryStore& store) {
+  if (store.WritePendingChanges(std::chrono::seconds(5))) return;
+  store.DropPendingChanges();
+  throw CommandFailed(fmt::format(
+      "could not write {}: another program kept it locked; it was left unchanged", store.Path()));
 }
 
 const SettingDescription* FindKnown(const std::string& name,
@@ -104,23 +109,6 @@ void Get(const SettingsOptions& o) {
       fmt::format("no setting \"{}\" in section \"{}\" of {}", o.name, section, store.Path()));
 }
 
-bool ParseBoolean(const std::string& text) {
-  std::string lower;
-  for (char c : text) lower += static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
-  if (lower == "true" || lower == "yes" || lower == "on" || lower == "1") return true;
-  if (lower == "false" || lower == "no" || lower == "off" || lower == "0") return false;
-  throw CommandFailed(fmt::format("\"{}\" is not a boolean (true or false)", text));
-}
-
-int32_t ParseLong(const std::string& text) {
-  std::optional<double> number = ParseNumber(text);
-  if (!number || *number != static_cast<double>(static_cast<int64_t>(*number)) ||
-      *number < -2147483648.0 || *number > 2147483647.0) {
-    throw CommandFailed(fmt::format("\"{}\" is not a whole number of 32 bits", text));
-  }
-  return static_cast<int32_t>(*number);
-}
-
 void Set(const SettingsOptions& o) {
   std::string section = SectionOf(o);
   const SettingDescription* known = FindKnown(o.name, section);
@@ -137,6 +125,7 @@ void Set(const SettingsOptions& o) {
   } else {
     SetStringSetting(store, o.name, section, o.value);
   }
+  FinishWriting(store);
 }
 
 void ListKey(FileRegistryStore& store, const std::string& key, const std::string& prefix) {
@@ -219,6 +208,7 @@ void Import(const SettingsOptions& o) {
   if (status != kRegistryOk) {
     throw CommandFailed(fmt::format("could not write {}; it was left unchanged", store.Path()));
   }
+  FinishWriting(store);
   std::cout << fmt::format("imported {} value{} into {}\n", values, values == 1 ? "" : "s",
                            store.Path());
 }
