@@ -29,6 +29,7 @@ class ScheduleHost : public TrayHost {
   void LoadSchedules() override {}
   void ShowOnDemand(const std::string&) override {}
   void SetOnDemandOnly(bool) override {}
+  void SimulateInput(int32_t, int32_t, int32_t) override {}
   bool Initialized() const override { return true; }
   std::shared_ptr<MonitoredShowEvent> CurrentShowEvent(DateTime t) override {
     return tav::CurrentShowEvent(state, t).Event;

@@ -8,8 +8,8 @@
 
 #include "config/MemoryRegistryStore.h"
 #include "ports/testing/ManualClock.h"
+#include "ports/testing/RecordingMessageLog.h"
 #include "ports/testing/VirtualTimerService.h"
-#include "show/testing/RecordingLog.h"
 #include "show/testing/ScriptedMediaPlayer.h"
 
 namespace tav {
@@ -42,7 +42,7 @@ class MediaGlueTest : public ::testing::Test {
   ScriptedMediaPlayer player{clock, timers, &timeline};
   MemoryRegistryStore registry;
   Settings settings{registry, PathDefaults{}};
-  RecordingLog log;
+  RecordingMessageLog log;
   std::unique_ptr<MediaGlue> glue;
 };
 

@@ -8,9 +8,9 @@
 
 #include "config/LibRegistry.h"
 #include "config/MemoryRegistryStore.h"
+#include "ports/testing/RecordingMessageLog.h"
 #include "ports/testing/VirtualTimerService.h"
 #include "show/TriggerFunctions.h"
-#include "show/testing/RecordingLog.h"
 #include "show/testing/ShowRig.h"
 #include "suite/channelio/testing/RecordingChannelIO.h"
 
@@ -57,7 +57,7 @@ class NetworkTest : public ::testing::Test {
 
   MemoryRegistryStore store;
   RecordingChannelIO cio;
-  RecordingLog log;
+  RecordingMessageLog log;
   std::unique_ptr<NetworkStartup> networks;
 };
 
@@ -161,7 +161,9 @@ class Host : public CallableByName {
  public:
   explicit Host(std::function<void()> update) : m_update(std::move(update)) {}
   void CallByName(const std::string& name) override {
-    if (name != "DoUpdateNetworkPrefsFromRegistry") throw UnknownOperationError("Host");
+    if (name != "DoUpdateNetworkPrefsFromRegistry") {
+      throw Error(438, "Host", "Object doesn't support this property or method");
+    }
     m_update();
   }
 
