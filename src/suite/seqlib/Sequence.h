@@ -11,6 +11,7 @@
 #include <cstdint>
 #include <functional>
 #include <memory>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -94,6 +95,8 @@ class Sequence {
   void InitMusicSync(int32_t positionMs);
   void SyncToMusic(int32_t positionMs);
   bool GetEvent(PlayEvent& event);
+  // SequencePlayer::MillisecondsUntilDue; nothing before a load.
+  std::optional<int64_t> MillisecondsUntilDue();
   int64_t Position() const;
 
   // Completes a command the shell-command manager prepared: it runs in the
