@@ -6,6 +6,7 @@
 
 #include <fmt/format.h>
 
+#include <chrono>
 #include <cstdio>
 #include <fstream>
 #include <iostream>
@@ -13,13 +14,13 @@
 #include <optional>
 #include <sstream>
 
+#include "ArgumentValues.h"
 #include "CommandRegistry.h"
+#include "SettingsStore.h"
 #include "config/LibRegistry.h"
 #include "config/RegistryFileFormat.h"
 #include "config/Settings.h"
 #include "platform/FileRegistryStore.h"
-#include "platform/PlatformPaths.h"
-#include "support/Numbers.h"
 
 namespace tav::showctl {
 namespace {
@@ -35,14 +36,8 @@ struct SettingsOptions {
   bool skipBadLines = false;
 };
 
-std::string SettingsFile(const SettingsOptions& o) {
-  return o.file.empty() ? RegistryFilePath() : o.file;
-}
-
 FileRegistryStore OpenStore(const SettingsOptions& o) {
-  return FileRegistryStore(SettingsFile(o), [](const std::string& problem) {
-    std::cerr << "showctl: warning: " << problem << "\n";
-  });
+  return OpenSettingsStore(o.file);
 }
 
 const SettingDescription* FindKnown(const std::string& name,
@@ -104,23 +99,6 @@ void Get(const SettingsOptions& o) {
       fmt::format("no setting \"{}\" in section \"{}\" of {}", o.name, section, store.Path()));
 }
 
-bool ParseBoolean(const std::string& text) {
-  std::string lower;
-  for (char c : text) lower += static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
-  if (lower == "true" || lower == "yes" || lower == "on" || lower == "1") return true;
-  if (lower == "false" || lower == "no" || lower == "off" || lower == "0") return false;
-  throw CommandFailed(fmt::format("\"{}\" is not a boolean (true or false)", text));
-}
-
-int32_t ParseLong(const std::string& text) {
-  std::optional<double> number = ParseNumber(text);
-  if (!number || *number != static_cast<double>(static_cast<int64_t>(*number)) ||
-      *number < -2147483648.0 || *number > 2147483647.0) {
-    throw CommandFailed(fmt::format("\"{}\" is not a whole number of 32 bits", text));
-  }
-  return static_cast<int32_t>(*number);
-}
-
 void Set(const SettingsOptions& o) {
   std::string section = SectionOf(o);
   const SettingDescription* known = FindKnown(o.name, section);
@@ -137,6 +115,7 @@ void Set(const SettingsOptions& o) {
   } else {
     SetStringSetting(store, o.name, section, o.value);
   }
+  FinishWriting(store);
 }
 
 void ListKey(FileRegistryStore& store, const std::string& key, const std::string& prefix) {
@@ -219,6 +198,7 @@ void Import(const SettingsOptions& o) {
   if (status != kRegistryOk) {
     throw CommandFailed(fmt::format("could not write {}; it was left unchanged", store.Path()));
   }
+  FinishWriting(store);
   std::cout << fmt::format("imported {} value{} into {}\n", values, values == 1 ? "" : "s",
                            store.Path());
 }
@@ -283,25 +263,25 @@ void Register(CLI::App& app) {
       "list", "List every setting the player reads, then any other stored values");
   list->callback([o] { List(*o); });
 
-  auto* import = settings->add_subcommand(
+  auto* importCmd = settings->add_subcommand(
       "import",
       "Merge a registry export file (Windows 5.00 in UTF-16 or UTF-8, or REGEDIT4) into the "
       "settings; nothing changes if it has unreadable lines");
-  import->add_option("file", o->path, "Export file to read, - for standard input")->required();
-  import->add_flag("--skip-bad-lines", o->skipBadLines,
-                   "Import the readable lines even if others cannot be read");
-  import->callback([o] { Import(*o);
-});
+  importCmd->add_option("file", o->path, "Export file to read, - for standard input")->required();
+  importCmd->add_flag("--skip-bad-lines", o->skipBadLines,
+                      "Import the readable lines even if others cannot be read");
+  importCmd->callback([o] { Import(*o); });
 
-auto* exportCmd = settings->add_subcommand(
-    "export", "Write the settings as a registry export file (to standard output by default)");
-exportCmd->add_option("file", o->path, "File to write, - for standard output");
-exportCmd->add_flag("--utf16", o->utf16,
-                    "Write UTF-16 with a byte-order mark, as Windows' registry editor expects");
-exportCmd->callback([o] { Export(*o); });
+  auto* exportCmd = settings->add_subcommand(
+      "export", "Write the settings as a registry export file (to standard output by default)");
+  exportCmd->add_option("file", o->path, "File to write, - for standard output");
+  exportCmd->add_flag("--utf16", o->utf16,
+                      "Write UTF-16 with a byte-order mark, as Windows' registry editor expects");
+  exportCmd->callback([o] { Export(*o); });
+}
+
 }  // namespace
 
-CommandGroup reg{"settings", Register};
+static CommandGroup reg{"settings", Register};
 
-}  // namespace tav::showctl
 }  // namespace tav::showctl

@@ -140,7 +140,7 @@ class LoopbackControls : public ::testing::Test {
     b.ApplyNetworkPreferences(listening);
     b.SetupClient(false, "B", true);
     b.SetOnInput([this](const ChannelInputEvent& e) { inputs.push_back(e.inputNumber); });
-    ASSERT_TRUE(b.ListenerIsOpen()) << ::testing::PrintToString(log.Texts());
+    ASSERT_TRUE(b.ListenerIsOpen()) << ::testing::PrintToString(log.lines);
 
     raw = network.OpenReceiver("lo", port, IPv4Endpoint{{239, 255, 0, 9}, port},
                                [this](std::span<const ReceivedDatagram> batch) {

@@ -38,7 +38,10 @@ struct CompiledSequence {
   int64_t lengthMs = 0;
   std::string media;
   std::string shellCommand;
-  // As the source names them, kept so a stale export can be recognised.
+  // The files merged in: for a compiled plain sequence and its export every
+  // included file as the library found it (nested ones too, at their offset
+  // in this sequence), kept so a stale export can be recognised; as the
+  // authored data names them when compiled from data alone.
   std::vector<SubsequenceRef> subsequences;
   uint64_t sourceHash = 0;
   std::vector<CompiledChannel> channels;
@@ -46,7 +49,11 @@ struct CompiledSequence {
   std::vector<LevelTrack> tracks;
 
   bool UsesFamily(int32_t family) const;
-  size_t FrameCount() const;  // over all tracks
+  // Frames of the timeline: moments at which a frame is due, counted once
+  // however many tracks share them.
+  size_t TimelineFrameCount() const;
+  // Level blocks as played: one per track and frame.
+  size_t LevelBlockCount() const;
   friend bool operator==(const CompiledSequence&, const CompiledSequence&) = default;
 };
 

@@ -6,17 +6,26 @@
 // disk block by block; absolute FSEQ channels land on DMX universes through
 // the universe map.
 //
+// An export lists every file its sequence included, nested ones too, as the
+// library found them, and records the combined content hash of the sequence
+// file and all of those (ContentHash.h): editing any of them, or putting
+// back an older copy with an older time, makes the export stale.
+//
 // Shares the clock, the file system and the resolver with whoever made it;
 // the sequences it makes keep what they need alive on their own.
 
+#include <cstdint>
 #include <functional>
 #include <memory>
+#include <optional>
 #include <string>
+#include <vector>
 
 #include "suite/seqlib/FileSystem.h"
 #include "suite/seqlib/PathResolver.h"
 #include "suite/seqlib/SequenceData.h"
 #include "suite/seqlib/SequenceLibrary.h"
+#include "suite/seqlib/StreamedSequence.h"
 #include "suite/seqlib/UniverseMap.h"
 
 namespace tav {
@@ -36,6 +45,8 @@ class FileSequenceLibrary : public SequenceLibrary {
   std::shared_ptr<Sequence> CreateSequence() override;
   std::shared_ptr<Sequence> LoadCompressed(const std::string& path) override;
   void WriteCompressed(const Sequence& sequence, const std::string& path) override;
+  std::optional<uint64_t> CurrentSourceHash(const std::string& sequencePath,
+                                            const std::vector<std::string>& includedFiles) override;
 
   // What a load produces, without a sequence object around it.
   std::shared_ptr<const SequenceContent> LoadContent(
@@ -43,6 +54,16 @@ class FileSequenceLibrary : public SequenceLibrary {
   // Any sequence file in the compiled form (an FSEQ file read whole).
   std::shared_ptr<const CompiledSequence> LoadCompiled(
       const std::string& path, const std::function<void()>& keepAlive = {}) const;
+
+  // "plain", "fseq" or "tcs", judged by the content. Throws tav::Error for
+  // a missing file or one of no known format.
+  std::string FormatOf(const std::string& path) const;
+  // Any sequence file as a stream of frames: an export or an FSEQ file is
+  // read a block at a time (opening reads its headers only); a plain
+  // sequence is compiled in memory first. An FSEQ file's source hash is
+  // left 0 unless `hashFseq`, which reads the whole file once more.
+  std::unique_ptr<StreamedSequence> OpenStreamed(const std::string& path,
+                                                 bool hashFseq = false) const;
 
   struct Core;
 

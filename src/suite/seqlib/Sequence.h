@@ -11,6 +11,7 @@
 #include <cstdint>
 #include <functional>
 #include <memory>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -33,7 +34,8 @@ struct SequenceInfo {
   std::vector<int32_t> families;  // in ascending order
   size_t channelCount = 0;        // effect channels, or FSEQ channels
   size_t effectCount = 0;
-  size_t frameCount = 0;  // FSEQ frames, or frames over all tracks
+  size_t frameCount = 0;       // frames of the timeline
+  size_t levelBlockCount = 0;  // level blocks over all tracks and frames
   uint64_t sourceHash = 0;
 };
 
@@ -56,9 +58,13 @@ class Sequence {
 
   Sequence(std::shared_ptr<const Clock> clock, SequenceLoader loader);
 
-  // The KeepAlive event: raised while a large file loads, so outputs keep
-  // refreshing although the loop is busy.
+  // The KeepAlive event: raised while a large file loads or its export is
+  // written, so outputs keep refreshing although the loop is busy.
   void SetKeepAlive(std::function<void()> handler) { m_keepAlive = std::move(handler); }
+  // For long work on this sequence (loading it, writing its export): a
+  // function to call now and then that raises KeepAlive at most every
+  // kKeepAliveIntervalMs, the first call always.
+  std::function<void()> KeepAliveRaiser() const;
   // Loads the file (format judged by content). Throws tav::Error.
   void LoadFile(const std::string& path);
   void Attach(std::shared_ptr<const SequenceContent> content);
@@ -89,8 +95,8 @@ class Sequence {
   void InitMusicSync(int32_t positionMs);
   void SyncToMusic(int32_t positionMs);
   bool GetEvent(PlayEvent& event);
-  // See SequencePlayer::NextEventIn; -1 before a load.
-  int64_t NextEventIn();
+  // SequencePlayer::MillisecondsUntilDue; nothing before a load.
+  std::optional<int64_t> MillisecondsUntilDue();
   int64_t Position() const;
 
   // Completes a command the shell-command manager prepared: it runs in the

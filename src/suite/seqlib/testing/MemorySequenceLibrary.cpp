@@ -31,7 +31,8 @@ struct MemorySequenceLibrary::State {
     }
     content->info.channelCount = c->channels.size();
     content->info.effectCount = c->effects.size();
-    content->info.frameCount = c->FrameCount();
+    content->info.frameCount = c->TimelineFrameCount();
+    content->info.levelBlockCount = c->LevelBlockCount();
     content->compiled = c;
     content->openStream = [c] { return std::make_unique<CompiledEventStream>(c); };
     auto exported = entry.exported;
@@ -96,6 +97,13 @@ void MemorySequenceLibrary::WriteCompressed(const Sequence& sequence, const std:
   m_state->compressed[path] = {content->compiled, std::make_shared<bool>(true)};
   auto it = m_state->plain.find(content->info.path);
   if (it != m_state->plain.end()) *it->second.exported = true;
+}
+
+std::optional<uint64_t> MemorySequenceLibrary::CurrentSourceHash(const std::string& sequencePath,
+                                                                 const std::vector<std::string>&) {
+  auto it = m_state->plain.find(sequencePath);
+  if (it == m_state->plain.end()) return std::nullopt;
+  return it->second.compiled->sourceHash;
 }
 
 }  // namespace tav

@@ -17,6 +17,7 @@
 
 #include "CommandRegistry.h"
 #include "SequencePlay.h"
+#include "SettingsStore.h"
 #include "UserData.h"
 #include "config/NetworkPreferences.h"
 #include "platform/EventLoop.h"
@@ -98,7 +99,7 @@ int Play(const PlayOptions& o, const std::string& folder) {
   EventLoop loop;
   auto clock = std::make_shared<SystemClock>();
   std::string registryFile = RegistryFilePath();
-  FileRegistryStore store(registryFile);
+  FileRegistryStore store = OpenSettingsStore("");
   NetworkPreferences prefs;
   prefs.InitFromRegistry(store);
   for (const auto& problem : prefs.Problems())
@@ -225,11 +226,13 @@ int Play(const PlayOptions& o, const std::string& folder) {
       control.SendAccumulated(last);
       sealedUpTo = last;
     }
-    int64_t in = more ? 0 : sequence->NextEventIn();
-    if (in < 0) {
+    std::optional<int64_t> due =
+        more ? std::optional<int64_t>(0) : sequence->MillisecondsUntilDue();
+    if (!due) {
       loop.Stop();
       return;
     }
+    int64_t in = *due;
     uint32_t next = clock->TickCount() + static_cast<uint32_t>(std::min<int64_t>(in, 60000));
     if (!stopping && limitMs && static_cast<int32_t>(next - (started + limitMs)) > 0)
       next = started + limitMs;
@@ -269,6 +272,7 @@ int Play(const PlayOptions& o, const std::string& folder) {
   loop.Run();
 
   control.ReleaseClient();
+  FinishWriting(store);  // a new source identifier, if one was made
   ChannelIOStatistics stats = control.Statistics();
   if (view) view->DrawNow(o.file + "  " + Summary(stats, elapsed()));
   if (!o.quiet)
