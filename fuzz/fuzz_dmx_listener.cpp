@@ -28,9 +28,7 @@ void CheckReaders(const uint8_t* data, size_t size) {
   }
 }
 
-}  // namespace
-
-TAV_FUZZ_TARGET({
+void FuzzOne(std::string_view input) {
   std::vector<std::string_view> datagrams;
   std::string_view rest = input;
   for (;;) {
@@ -61,4 +59,8 @@ TAV_FUZZ_TARGET({
   for (int32_t slot : pressed) {
     if (slot < 1 || slot > 512) std::abort();
   }
-})
+}
+
+}  // namespace
+
+TAV_FUZZ_TARGET(FuzzOne(input))

@@ -38,6 +38,7 @@ struct TimerfdDeadlineTimer::Core : std::enable_shared_from_this<Core> {
   std::function<void()> handler;
   bool waiting = false;
   bool armed = false;
+  uint32_t deadline = 0;
   bool closed = false;
 };
 
@@ -62,6 +63,9 @@ void TimerfdDeadlineTimer::SetOnDeadline(std::function<void()> handler) {
 }
 
 void TimerfdDeadlineTimer::SetDeadline(uint32_t tick) {
+  // Set again to the same tick (each frame re-arms): nothing to change.
+  if (m_core->armed && m_core->deadline == tick) return;
+  m_core->deadline = tick;
   // SystemClock's tick is the steady clock in milliseconds, cut to 32 bits:
   // put the tick back on the full time line next to now.
   using namespace std::chrono;
@@ -77,6 +81,7 @@ void TimerfdDeadlineTimer::SetDeadline(uint32_t tick) {
 }
 
 void TimerfdDeadlineTimer::Cancel() {
+  if (!m_core->armed) return;
   itimerspec spec{};
   ::timerfd_settime(m_core->descriptor.native_handle(), 0, &spec, nullptr);
   m_core->armed = false;

@@ -8,6 +8,7 @@
 
 #include "config/MemoryRegistryStore.h"
 #include "ports/testing/ManualClock.h"
+#include "ports/testing/RecordingMessageLog.h"
 #include "ports/testing/VirtualTimerService.h"
 #include "show/testing/ScriptedMediaPlayer.h"
 
@@ -16,14 +17,6 @@ namespace {
 
 using ::testing::ElementsAre;
 using ::testing::IsEmpty;
-
-class Lines : public MessageLog {
- public:
-  void LogMessage(int32_t level, const std::string& szText, const SequenceIdentity*) override {
-    lines.push_back(std::to_string(level) + " " + szText);
-  }
-  std::vector<std::string> lines;
-};
 
 class MediaGlueTest : public ::testing::Test {
  protected:
@@ -49,7 +42,7 @@ class MediaGlueTest : public ::testing::Test {
   ScriptedMediaPlayer player{clock, timers, &timeline};
   MemoryRegistryStore registry;
   Settings settings{registry, PathDefaults{}};
-  Lines log;
+  RecordingMessageLog log;
   std::unique_ptr<MediaGlue> glue;
 };
 

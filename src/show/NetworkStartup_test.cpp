@@ -8,6 +8,7 @@
 
 #include "config/LibRegistry.h"
 #include "config/MemoryRegistryStore.h"
+#include "ports/testing/RecordingMessageLog.h"
 #include "ports/testing/VirtualTimerService.h"
 #include "show/TriggerFunctions.h"
 #include "show/testing/ShowRig.h"
@@ -18,14 +19,6 @@ namespace {
 
 using ::testing::ElementsAre;
 using ::testing::IsEmpty;
-
-class Lines : public MessageLog {
- public:
-  void LogMessage(int32_t level, const std::string& szText, const SequenceIdentity*) override {
-    lines.push_back(std::to_string(level) + " " + szText);
-  }
-  std::vector<std::string> lines;
-};
 
 // The four settings of every TAV network, in order, as the control records
 // them.
@@ -64,7 +57,7 @@ class NetworkTest : public ::testing::Test {
 
   MemoryRegistryStore store;
   RecordingChannelIO cio;
-  Lines log;
+  RecordingMessageLog log;
   std::unique_ptr<NetworkStartup> networks;
 };
 
@@ -168,8 +161,9 @@ class Host : public CallableByName {
  public:
   explicit Host(std::function<void()> update) : m_update(std::move(update)) {}
   void CallByName(const std::string& name) override {
-    if (name != "DoUpdateNetworkPrefsFromRegistry")
+    if (name != "DoUpdateNetworkPrefsFromRegistry") {
       throw Error(438, "Host", "Object doesn't support this property or method");
+    }
     m_update();
   }
 

@@ -112,6 +112,12 @@ class ShowPlayer {
   void AddRegistryWatch(RegistryWatcher& watcher, std::shared_ptr<CallableByName> callObject);
   const NetworkPreferences& NetworkSettings() const { return m_networks.Preferences(); }
 
+  // An input as the I/O control would raise it; for trying a show without
+  // the hardware (the tray's simulated input). Handled like a real one.
+  void SimulateInput(int32_t network, int32_t unitId, int32_t inputNumber) {
+    m_CIO_InputEvent({network, unitId, inputNumber, ""});
+  }
+
   Pacing GetPacing() const { return m_pacing; }
   void SetPacing(Pacing pacing);
   // Something the engine cannot see changed what its next tick would do;

@@ -476,5 +476,35 @@ TEST_F(ShowTest, AFailingOutputIsReportedOnceAndTheShowGoesOn) {
                           "2499 cio OutputEffect(7, 1, 0, 1, lamp, 0, 0, 0, 0, 0) @2504"));
 }
 
+TEST_F(ShowTest, ASequenceFileThatDoesNotExistIsReportedAndTheSectionGoesOn) {
+  Write("ok.tseq", 1000);
+  ShowParts parts;
+  parts.main = {"missing.tseq", "ok.tseq"};
+  Play(parts);
+  rig.Advance(1500);
+  EXPECT_THAT(rig.timeline.Texts("log 1 Checking"),
+              ElementsAre("log 1 Checking Q7 sequence: missing.tseq"));
+  EXPECT_THAT(rig.timeline.Texts("host playback"),
+              ElementsAre("host playback file for missing.tseq: none"));
+  EXPECT_THAT(Starts(), ::testing::Contains(::testing::HasSubstr("ok.tseq")));
+}
+
+TEST_F(ShowTest, AMediaFileThatCannotBePlayedIsReportedAndItsPieceEnds) {
+  Write("song.tseq", 10'000, "song.mp3");
+  rig.media.Script("song.mp3", {10.0, "audio", {"File not found", "No decoder"}, {}});
+  ShowParts parts;
+  parts.musical = {"song.tseq"};
+  parts.delay = 60;
+  Play(parts);
+  rig.Advance(100);
+  EXPECT_THAT(rig.timeline.TimedTexts("log"),
+              ElementsAre("1 log 1 Starting show: xmas.tsh", "2 log 1 Loading sequence: song.tseq",
+                          "2 log 1 Starting <song.tseq>",
+                          "2 log 3 WINDOWS MEDIA PLAYER ERROR (Error playing media file: File not "
+                          "found / No decoder):  <song.tseq>",
+                          "3 log 1 Ending <song.tseq>",
+                          "4 log 1 Delaying between Musical sequences for 60 seconds"));
+}
+
 }  // namespace
 }  // namespace tav

@@ -87,7 +87,9 @@ TEST_F(TriggerTest, AJukeboxIgnoresPressesWhileItPlaysAndKeepsItsRoundRobin) {
 TEST_F(TriggerTest, ARoundRobinOfThreeWraps) {
   auto jukebox = Group(false, false, {"a.tseq", "b.tseq", "c.tseq"});
   Play({jukebox});
-  for (uint64_t t : {100u, 1200u, 2300u, 3400u}) PressAt(t);
+  for (uint64_t t : {100u, 1200u, 2300u}) PressAt(t);
+  // The tray's simulated input counts as a press.
+  rig.At(3400, [this] { rig.player->SimulateInput(1, 1, 1); });
   rig.Advance(5000);
   EXPECT_THAT(Starts(),
               ElementsAre("110 <a.tseq>", "1210 <b.tseq>", "2310 <c.tseq>", "3410 <a.tseq>"));

@@ -171,15 +171,19 @@ void ChannelIOControl::SetTAVNetworkPort(int32_t network, const std::string& por
   settings.SetOldMCP(m_tavSettings[network].OldMCP());
   settings.SetEnhanced(m_tavSettings[network].Enhanced());
   settings.SetPort(port);
-  auto& slot = m_tavSerial[network];
+  auto existing = m_tavSerial.find(network);
+  std::unique_ptr<NetworkOutput> output;
+  if (existing != m_tavSerial.end()) {
+    output = std::move(existing->second);
+    m_tavSerial.erase(existing);
+  }
   if (port.empty()) {
-    if (slot) slot->Close();
-    m_tavSerial.erase(network);
+    if (output) output->Close();
     return;
   }
-  OpenSerial("TAV network " + std::to_string(network + 1) + " on " + port, slot,
+  OpenSerial("TAV network " + std::to_string(network + 1) + " on " + port, output,
              [&] { return m_ports.serial->OpenTAVNetwork(network + 1, settings, m_levels); });
-  if (!slot) m_tavSerial.erase(network);
+  if (output) m_tavSerial[network] = std::move(output);
 }
 
 void ChannelIOControl::OpenX10Network(const std::string& port) {
@@ -248,22 +252,28 @@ void ChannelIOControl::ApplyNetworkPreferences(const NetworkPreferences& prefs) 
   ConfigureUdpOutputs(prefs, plan);
   ConfigureListener(prefs);
 
-  std::map<int32_t, std::unique_ptr<NetworkOutput>> widgets;
+  // USB widgets: one whose entry is unchanged keeps running; others open.
+  std::vector<std::pair<DMXUniversePrefs, std::unique_ptr<NetworkOutput>>> widgets;
   for (int32_t index : plan.serialEntries) {
     const DMXUniversePrefs& entry = prefs.DMXUniverse(index);
+    auto same = std::find_if(m_widgets.begin(), m_widgets.end(),
+                             [&](const auto& w) { return w.first == entry && w.second; });
+    if (same != m_widgets.end()) {
+      widgets.push_back(std::move(*same));
+      m_widgets.erase(same);
+      continue;
+    }
     std::string what = "DMX universe " + std::to_string(entry.Universe()) + " (" +
                        DMXTransportName(entry.Transport()) + " on " + entry.Port() + ")";
-    auto existing = m_widgets.find(index);
-    if (existing != m_widgets.end()) widgets[index] = std::move(existing->second);
+    std::unique_ptr<NetworkOutput> output;
     try {
-      OpenSerial(what, widgets[index],
-                 [&] { return m_ports.serial->OpenDMXWidget(entry, m_levels); });
+      OpenSerial(what, output, [&] { return m_ports.serial->OpenDMXWidget(entry, m_levels); });
     } catch (const Error& e) {
       Log(2, what + ": " + e.Description() + "; it stays off");
     }
-    if (!widgets[index]) widgets.erase(index);
+    if (output) widgets.push_back({entry, std::move(output)});
   }
-  for (auto& [index, output] : m_widgets) {
+  for (auto& [entry, output] : m_widgets) {
     if (output) output->Close();
   }
   m_widgets = std::move(widgets);

@@ -181,7 +181,7 @@ class ChannelIOControl : public ChannelIO {
   std::map<int32_t, std::unique_ptr<NetworkOutput>> m_tavSerial;  // by preferences index
   std::unique_ptr<NetworkOutput> m_x10;
   std::unique_ptr<NetworkOutput> m_fennick;
-  std::map<int32_t, std::unique_ptr<NetworkOutput>> m_widgets;  // by preferences index
+  std::vector<std::pair<DMXUniversePrefs, std::unique_ptr<NetworkOutput>>> m_widgets;
   std::vector<TAVNetworkPreferences> m_tavSettings;
   std::map<int32_t, TAVMapping> m_tavMappings;                  // by event network (index + 1)
   std::map<std::pair<int32_t, int32_t>, uint64_t> m_tavMapped;  // unit -> version mapped

@@ -6,6 +6,8 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <algorithm>
+
 #include "config/LibRegistry.h"
 #include "config/MemoryRegistryStore.h"
 #include "ports/testing/ManualClock.h"
@@ -22,6 +24,13 @@ namespace {
 
 using ::testing::ElementsAre;
 using ::testing::IsEmpty;
+
+// How many logged lines contain `part`.
+size_t Containing(const RecordingMessageLog& log, const std::string& part) {
+  return static_cast<size_t>(
+      std::count_if(log.lines.begin(), log.lines.end(),
+                    [&](const std::string& l) { return l.find(part) != std::string::npos; }));
+}
 
 class FakeClaim : public OutputClaim {
  public:
@@ -360,15 +369,17 @@ TEST_F(Control, EachBadEntryIsOneLogLineAndTheOthersRun) {
   prefs.DMXUniverse(3).SetDestination("10.9.9.9");
   prefs.DMXUniverse(4).SetDestination("no.such.host");
   Start(prefs);
-  EXPECT_EQ(log.Lines().size(), 4u) << ::testing::PrintToString(log.Texts());
-  EXPECT_EQ(log.CountContaining("DMX universe 70000 (E1.31, entry 2): the universe is outside "
-                                "1-63999; it stays off"),
+  EXPECT_EQ(log.lines.size(), 4u) << ::testing::PrintToString(log.lines);
+  EXPECT_EQ(Containing(log,
+                       "DMX universe 70000 (E1.31, entry 2): the universe is outside "
+                       "1-63999; it stays off"),
             1u);
-  EXPECT_EQ(log.CountContaining("The E1.31 universes on interface \"eth9\" stay off"), 1u);
-  EXPECT_EQ(log.CountContaining("DMX universe 4 (E1.31, entry 4): 10.9.9.9:5568 cannot be "
-                                "reached from the default interface (Network is unreachable)"),
+  EXPECT_EQ(Containing(log, "The E1.31 universes on interface \"eth9\" stay off"), 1u);
+  EXPECT_EQ(Containing(log,
+                       "DMX universe 4 (E1.31, entry 4): 10.9.9.9:5568 cannot be "
+                       "reached from the default interface (Network is unreachable)"),
             1u);
-  EXPECT_EQ(log.CountContaining("\"no.such.host\" cannot be found"), 1u);
+  EXPECT_EQ(Containing(log, "\"no.such.host\" cannot be found"), 1u);
   for (int32_t u : {1, 3, 4, 5}) Levels(u, 9, 1025);
   control.SendAccumulated(1025);
   timer.RunUntil(1025);
@@ -433,7 +444,7 @@ TEST_F(Control, TheSourceIdentifierIsMadeOnceAndKeptInTheSettings) {
 
   prefs.SetSourceCID("not a uuid");
   control.ApplyNetworkPreferences(prefs);
-  EXPECT_EQ(log.CountContaining("\"not a uuid\" in the network preferences is not a UUID"), 1u);
+  EXPECT_EQ(Containing(log, "\"not a uuid\" in the network preferences is not a UUID"), 1u);
   EXPECT_EQ(GetStringSetting(store, "SourceCID", "Network", ""), kept);
 }
 
@@ -515,7 +526,7 @@ TEST_F(Control, AFullSocketBufferDropsCountsAndLogsOnce) {
     timer.RunUntil(1000 + 25 * k);
   }
   EXPECT_EQ(control.Statistics().packetsDropped, 4u);
-  EXPECT_EQ(log.CountContaining("packets dropped (Resource temporarily unavailable)"), 1u);
+  EXPECT_EQ(Containing(log, "packets dropped (Resource temporarily unavailable)"), 1u);
   network.SetBufferFull(false);
   Levels(1, 9, 1200);
   control.SendAccumulated(1200);
@@ -601,8 +612,9 @@ TEST_F(Control, AListenerThatCannotOpenIsOneLogLine) {
   NetworkPreferences prefs = Prefs();
   prefs.Listener().SetEnabled(true);
   Start(prefs);
-  EXPECT_EQ(log.CountContaining("The DMX listener (E1.31 universe 1) cannot listen: Address "
-                                "already in use; inputs from it stay off"),
+  EXPECT_EQ(Containing(log,
+                       "The DMX listener (E1.31 universe 1) cannot listen: Address "
+                       "already in use; inputs from it stay off"),
             1u);
   EXPECT_FALSE(control.ListenerIsOpen());
 }
@@ -611,12 +623,105 @@ TEST_F(Control, SerialNetworksWithoutATransmitterKeepTheirLevels) {
   Start();
   control.SetTAVNetworkPort(0, "/dev/ttyUSB0");
   control.OpenFennickNetwork("/dev/ttyUSB1");
-  EXPECT_EQ(log.CountContaining("TAV network 1 on /dev/ttyUSB0: no serial transmitter"), 1u);
-  EXPECT_EQ(log.CountContaining("Fennick network on /dev/ttyUSB1: no serial transmitter"), 1u);
+  EXPECT_EQ(Containing(log, "TAV network 1 on /dev/ttyUSB0: no serial transmitter"), 1u);
+  EXPECT_EQ(Containing(log, "Fennick network on /dev/ttyUSB1: no serial transmitter"), 1u);
   control.OutputEffect(kFamilyFennick, 1, 0, 3, "", kEffectSet, 0, 100, 100, 0, 1025);
   control.SendAccumulated(1025);
   timer.RunUntil(1025);
   EXPECT_EQ(control.Levels().FennickLevel(1, 3), 255);
+}
+
+}  // namespace
+}  // namespace tav
+
+namespace tav {
+namespace {
+
+// A serial transmitter that records the frames it is handed.
+class FakeSerialOutput : public NetworkOutput {
+ public:
+  FakeSerialOutput(std::string name, std::vector<std::string>& journal)
+      : m_name(std::move(name)), m_journal(journal) {
+    m_journal.push_back("open " + m_name);
+  }
+  std::string Name() const override { return m_name; }
+  void Send(const OutputFrame& frame) override {
+    if (frame.newFrame) m_journal.push_back(m_name + " frame at " + std::to_string(frame.now));
+  }
+  std::optional<uint32_t> NextRefresh() const override { return std::nullopt; }
+  void Close() override { m_journal.push_back("close " + m_name); }
+  OutputCounters Counters() const override { return {}; }
+
+ private:
+  std::string m_name;
+  std::vector<std::string>& m_journal;
+};
+
+class FakeSerialFactory : public SerialOutputFactory {
+ public:
+  std::unique_ptr<NetworkOutput> OpenTAVNetwork(int32_t network, const TAVNetworkPreferences& p,
+                                                LevelBuffers&) override {
+    if (p.Port() == "/dev/busy")
+      throw Error(kErrorPortAlreadyOpen, "Serial.Open", "the port is already open");
+    return std::make_unique<FakeSerialOutput>(
+        "TAV " + std::to_string(network) + " at " + std::to_string(p.Speed()), journal);
+  }
+  std::unique_ptr<NetworkOutput> OpenX10(const std::string& port, const NetworkPreferences&,
+                                         LevelBuffers&) override {
+    return std::make_unique<FakeSerialOutput>("X10 " + port, journal);
+  }
+  std::unique_ptr<NetworkOutput> OpenFennick(const std::string& port, const FennickPreferences&,
+                                             LevelBuffers&) override {
+    return std::make_unique<FakeSerialOutput>("Fennick " + port, journal);
+  }
+  std::unique_ptr<NetworkOutput> OpenDMXWidget(const DMXUniversePrefs& p, LevelBuffers&) override {
+    return std::make_unique<FakeSerialOutput>("widget " + p.Port(), journal);
+  }
+  std::vector<std::string> journal;
+};
+
+class Serial : public Control {
+ protected:
+  Serial() {
+    ChannelIOPorts ports = Ports();
+    ports.serial = &factory;
+    serial = std::make_unique<ChannelIOControl>(ports);
+  }
+  FakeSerialFactory factory;
+  std::unique_ptr<ChannelIOControl> serial;
+};
+
+TEST_F(Serial, SerialNetworksAreOutputsOfTheSameFrames) {
+  NetworkPreferences prefs = Prefs({});
+  DMXUniversePrefs widget;
+  widget.SetUniverse(4);
+  widget.SetTransport(DMXTransport::kUSBPro);
+  widget.SetPort("/dev/ttyUSB3");
+  prefs.AddDMXUniverse(widget);
+  serial->ApplyNetworkPreferences(prefs);
+  serial->SetTAVNetworkSpeed(0, 19200);
+  serial->SetTAVNetworkPort(0, "/dev/ttyS0");
+  serial->OpenX10Network("/dev/ttyS1");
+  serial->SetupClient(true, "Show Player", true);
+  serial->OutputEffect(kFamilyX10, 1, 0, 1, "", kEffectSet, 0, 100, 100, 0, 1025);
+  serial->SendAccumulated(1025);
+  timer.RunUntil(1025);
+  EXPECT_THAT(factory.journal,
+              ElementsAre("open widget /dev/ttyUSB3", "open TAV 1 at 19200", "open X10 /dev/ttyS1",
+                          "widget /dev/ttyUSB3 frame at 1025", "TAV 1 at 19200 frame at 1025",
+                          "X10 /dev/ttyS1 frame at 1025"));
+  factory.journal.clear();
+  serial->ApplyNetworkPreferences(prefs);  // nothing changed: nothing reopens
+  EXPECT_THAT(factory.journal, IsEmpty());
+  serial->ReleaseClient();
+  EXPECT_THAT(factory.journal, ElementsAre("close TAV 1 at 19200", "close widget /dev/ttyUSB3",
+                                           "close X10 /dev/ttyS1"));
+}
+
+TEST_F(Serial, APortHeldElsewhereFailsWith8005) {
+  auto failure = testing::FailureOf([&] { serial->SetTAVNetworkPort(2, "/dev/busy"); });
+  EXPECT_EQ(failure.number, kErrorPortAlreadyOpen);
+  EXPECT_EQ(serial->OutputCount(), 0u);
 }
 
 }  // namespace

@@ -114,9 +114,6 @@ bool Sequence::GetEvent(PlayEvent& event) {
 std::optional<int64_t> Sequence::MillisecondsUntilDue() {
   return m_player ? m_player->MillisecondsUntilDue() : std::nullopt;
 }
-int64_t Sequence::NextEventIn() {
-  return m_player ? m_player->NextEventIn() : -1;
-}
 int64_t Sequence::Position() const {
   return m_player ? m_player->Position() : 0;
 }

@@ -34,7 +34,8 @@ struct SequenceInfo {
   std::vector<int32_t> families;  // in ascending order
   size_t channelCount = 0;        // effect channels, or FSEQ channels
   size_t effectCount = 0;
-  size_t frameCount = 0;  // FSEQ frames, or frames over all tracks
+  size_t frameCount = 0;       // frames of the timeline
+  size_t levelBlockCount = 0;  // level blocks over all tracks and frames
   uint64_t sourceHash = 0;
 };
 
@@ -96,8 +97,6 @@ class Sequence {
   bool GetEvent(PlayEvent& event);
   // SequencePlayer::MillisecondsUntilDue; nothing before a load.
   std::optional<int64_t> MillisecondsUntilDue();
-  // See SequencePlayer::NextEventIn; -1 before a load.
-  int64_t NextEventIn();
   int64_t Position() const;
 
   // Completes a command the shell-command manager prepared: it runs in the

@@ -1,7 +1,5 @@
 #include "suite/seqlib/SequencePlayer.h"
 
-#include <algorithm>
-
 #include "support/Error.h"
 
 namespace tav {
@@ -113,15 +111,6 @@ std::optional<int64_t> SequencePlayer::MillisecondsUntilDue() {
     if (elapsed < kMusicWaitMs) wait += kMusicWaitMs - elapsed;
   }
   return wait;
-}
-
-int64_t SequencePlayer::NextEventIn() {
-  if (m_state == kStateStopped) return -1;
-  if (m_state == kStateStopping) return 0;
-  int64_t position = Position();
-  int64_t next = m_stream->NextTime();
-  if (next == EventStream::kEnd) return std::max<int64_t>(0, m_length - position);
-  return std::max<int64_t>(0, next - m_lookahead - position);
 }
 
 bool SequencePlayer::GetEvent(PlayEvent& event) {

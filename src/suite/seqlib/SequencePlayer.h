@@ -64,11 +64,6 @@ class SequencePlayer {
   // sequence is stopped. Lets a caller sleep until then instead of polling;
   // a music position fed later may move the moment.
   std::optional<int64_t> MillisecondsUntilDue();
-  // Milliseconds until GetEvent next has something to hand out or to do
-  // (an event within the lookahead, the end of the timeline, lights-off
-  // events): 0 when it has now, -1 when play has ended. Lets a caller sleep
-  // until then instead of polling.
-  int64_t NextEventIn();
 
   // Where the timeline stands now, in milliseconds.
   int64_t Position() const;

@@ -95,23 +95,6 @@ TEST_F(Playback, EventsComeAtTheirTimesALittleEarlyWithTheirDueTick) {
   EXPECT_EQ(sequence->SequencePlayState(), SequencePlayer::kStateStopped);
 }
 
-TEST_F(Playback, NextEventInTellsHowLongACallerMaySleep) {
-  EXPECT_EQ(sequence->NextEventIn(), -1);
-  sequence->StartPlay();
-  EXPECT_EQ(sequence->NextEventIn(), 0);  // the set at 0
-  Drain();
-  EXPECT_EQ(sequence->NextEventIn(), 45);  // the frame at 50, less the lookahead
-  Advance(45);
-  EXPECT_EQ(sequence->NextEventIn(), 0);
-  Advance(400);
-  Drain();
-  EXPECT_EQ(sequence->NextEventIn(), 55);  // nothing left but the end at 500
-  Advance(55);
-  EXPECT_EQ(sequence->NextEventIn(), 0);
-  Drain();
-  EXPECT_EQ(sequence->NextEventIn(), -1);
-}
-
 TEST_F(Playback, StopPassesThroughStoppingAndPutsTheLightsOutWhenAsked) {
   sequence->SetLightsOffAtEnd(true);
   sequence->InitializeForPlay(false);

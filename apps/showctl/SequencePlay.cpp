@@ -13,9 +13,11 @@
 #include <cstdio>
 #include <iostream>
 #include <memory>
+#include <optional>
 
 #include "CommandRegistry.h"
 #include "SequencePlay.h"
+#include "SettingsStore.h"
 #include "UserData.h"
 #include "config/NetworkPreferences.h"
 #include "platform/EventLoop.h"
@@ -34,6 +36,8 @@
 
 namespace tav::showctl {
 namespace {
+
+constexpr uint32_t kPumpMs = 50;
 
 struct PlayOptions {
   std::string file;
@@ -95,7 +99,7 @@ int Play(const PlayOptions& o, const std::string& folder) {
   EventLoop loop;
   auto clock = std::make_shared<SystemClock>();
   std::string registryFile = RegistryFilePath();
-  FileRegistryStore store(registryFile);
+  FileRegistryStore store = OpenSettingsStore("");
   NetworkPreferences prefs;
   prefs.InitFromRegistry(store);
   for (const auto& problem : prefs.Problems())
@@ -186,6 +190,7 @@ int Play(const PlayOptions& o, const std::string& folder) {
   TimerfdDeadlineTimer pumpTimer(loop);
   bool stopping = false;
   bool pumping = false;
+  std::optional<uint32_t> sealedUpTo;
   uint32_t limitMs = o.seconds > 0 ? static_cast<uint32_t>(o.seconds * 1000) : 0;
   std::function<void()> pump = [&] {
     // Loading a block of the file may keep the outputs alive, which may
@@ -200,23 +205,44 @@ int Play(const PlayOptions& o, const std::string& folder) {
       stopping = true;
       sequence->StopPlay();
     }
+    // At most 50 ms at a time, as the show engine's pump: a sequence that
+    // cannot be read as fast as it plays must not hold the loop (or pile
+    // frames up) for ever.
     PlayEvent event;
     bool any = false;
     uint32_t last = 0;
+    uint32_t began = clock->TickCount();
+    bool more = false;
     while (sequence->GetEvent(event)) {
       Dispatch(control, event);
       any = true;
       last = event.dueTick;
+      if (clock->TickCount() - began > kPumpMs) {
+        more = true;
+        break;
+      }
     }
-    if (any) control.SendAccumulated(last);
-    int64_t in = sequence->NextEventIn();
-    if (in < 0) {
+    if (any) {
+      control.SendAccumulated(last);
+      sealedUpTo = last;
+    }
+    std::optional<int64_t> due =
+        more ? std::optional<int64_t>(0) : sequence->MillisecondsUntilDue();
+    if (!due) {
       loop.Stop();
       return;
     }
+    int64_t in = *due;
     uint32_t next = clock->TickCount() + static_cast<uint32_t>(std::min<int64_t>(in, 60000));
     if (!stopping && limitMs && static_cast<int32_t>(next - (started + limitMs)) > 0)
       next = started + limitMs;
+    // A frame still to leave by then wakes the loop anyway, and its observer
+    // pumps: one wake-up per frame instead of two.
+    if (sealedUpTo && static_cast<int32_t>(*sealedUpTo - clock->TickCount()) > 0 &&
+        static_cast<int32_t>(next - *sealedUpTo) >= 0) {
+      pumpTimer.Cancel();
+      return;
+    }
     pumpTimer.SetDeadline(next);
   };
   pumpTimer.SetOnDeadline(pump);
@@ -246,6 +272,7 @@ int Play(const PlayOptions& o, const std::string& folder) {
   loop.Run();
 
   control.ReleaseClient();
+  FinishWriting(store);  // a new source identifier, if one was made
   ChannelIOStatistics stats = control.Statistics();
   if (view) view->DrawNow(o.file + "  " + Summary(stats, elapsed()));
   if (!o.quiet)
