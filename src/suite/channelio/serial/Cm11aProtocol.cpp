@@ -163,7 +163,10 @@ void Cm11aProtocol::OnByte(uint8_t byte, uint32_t tick) {
       if (byte == m_expected) {
         Write({kCm11aTransmitOk});
         m_phase = Phase::kReady;
-        Arm(tick, m_timing.readyTimeoutMs);
+        // Waiting too short would send a relative dim twice.
+        const int32_t steps = m_exchangeIsClock ? 0 : m_command[m_step].dimSteps;
+        Arm(tick, m_timing.readyTimeoutMs +
+                      m_timing.readyTimeoutPerDimStepMs * static_cast<uint32_t>(steps));
       } else if (!Unprompted(byte, tick) && byte != kCm11aReady) {
         // (A late 0x55 belongs to an exchange that timed out; ignore it.)
         Failed(tick, true);

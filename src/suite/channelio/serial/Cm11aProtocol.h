@@ -35,7 +35,10 @@ namespace tav {
 
 struct Cm11aTiming {
   uint32_t checksumTimeoutMs = 1000;  // the checksum comes within milliseconds
-  uint32_t readyTimeoutMs = 4000;     // a power-line transmission takes up to a second
+  // A power-line transmission takes about half a second, and every dim step
+  // beyond the first another 11 mains cycles (220 ms at 50 Hz).
+  uint32_t readyTimeoutMs = 3000;
+  uint32_t readyTimeoutPerDimStepMs = 250;
   uint32_t uploadTimeoutMs = 1000;
   int32_t maxAttempts = 4;
   uint32_t firstPauseMs = 1000;

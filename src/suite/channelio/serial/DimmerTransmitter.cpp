@@ -1,6 +1,7 @@
 #include "suite/channelio/serial/DimmerTransmitter.h"
 
-#include <cmath>
+#include <iomanip>
+#include <sstream>
 
 namespace tav {
 namespace {
@@ -13,6 +14,12 @@ FrameSenderOptions SenderOptions(const DimmerNetworkSettings& settings) {
   options.stopBits = settings.serial.stopBits;
   options.refreshMs = settings.refreshMs;
   return options;
+}
+
+std::string OneDecimal(double value) {
+  std::ostringstream text;
+  text << std::fixed << std::setprecision(1) << value;
+  return text.str();
 }
 
 }  // namespace
@@ -31,8 +38,7 @@ DimmerTransmitter::DimmerTransmitter(DimmerNetworkSettings settings,
                           std::to_string(m_settings.serial.baud) + " baud carries " +
                           std::to_string(kDimmerTargetFrameRate) + " times a second (at most " +
                           std::to_string(carried) + "); frames will come about " +
-                          std::to_string(static_cast<int>(std::floor(FrameRateLimit()))) +
-                          " times a second");
+                          OneDecimal(FrameRateLimit()) + " times a second");
   }
 }
 

@@ -28,7 +28,7 @@ void X10SendQueue::SetTarget(int32_t house, int32_t unit, int32_t steps) {
   if (ExpectedSteps(house, unit) == steps) return;
   for (auto it = m_entries.rbegin(); it != m_entries.rend(); ++it) {
     if (it->house != house || it->unit != unit) continue;
-    if (IsDimLevel(it->steps) && IsDimLevel(steps)) {
+    if (IsDimLevel(it->steps)) {
       it->steps = steps;
       return;
     }
@@ -50,7 +50,7 @@ std::vector<X10Transmission> X10SendQueue::TakeNext() {
   out.push_back(X10Transmission::Address(entry.house, entry.unit));
   if (entry.steps == 0) {
     out.push_back(X10Transmission::Function(entry.house, X10Function::kOff));
-  } else if (entry.steps == kX10DimStepsFull || driven <= 0) {
+  } else if (entry.steps == kX10DimStepsFull || driven == 0) {
     out.push_back(X10Transmission::Function(entry.house, X10Function::kOn));
     if (entry.steps < kX10DimStepsFull) {
       out.push_back(X10Transmission::Function(entry.house, X10Function::kDim,

@@ -4,14 +4,15 @@
 // second, so level changes queue up here and leave in order, delayed but
 // never lost: a flash (on, then off) always reaches the lamp.
 //
-// Each entry is a unit's target level in dim steps (0 off, 22 full). Only a
-// dim level still waiting behind others may be replaced by a newer dim level
-// for the same unit: a fade collapses into its latest step, while an on or
-// off keeps its place. A target equal to what the unit will already be at is
-// dropped.
+// Each entry is a unit's target level in dim steps (0 off, 22 full). A dim
+// level still waiting is replaced by the unit's next target, so a fade
+// collapses into its latest step; an on or an off is never replaced, so it
+// reaches the lamp however soon the next change follows. A target equal to
+// what the unit will already be at is dropped.
 //
 // X10 dims relative to the lamp's level, so the queue keeps the level each
-// unit was last driven to and turns a target into transmissions from there:
+// unit was last driven to (every lamp is taken as off when the network
+// opens) and turns a target into transmissions from there:
 // an address, then Off, On, or Dim/Bright by the difference (a lamp that was
 // off is first switched on, which brings it to full, then dimmed).
 //
@@ -42,7 +43,7 @@ class X10SendQueue {
   // queue is.
   std::vector<X10Transmission> TakeNext();
 
-  // The level a unit was last driven to: 0-22, or -1 when not yet driven.
+  // The level a unit was last driven to, 0-22 (-1 out of range).
   int32_t DrivenSteps(int32_t house, int32_t unit) const;
 
  private:
@@ -58,7 +59,7 @@ class X10SendQueue {
   int32_t ExpectedSteps(int32_t house, int32_t unit) const;
 
   std::deque<Entry> m_entries;
-  std::vector<int32_t> m_driven = std::vector<int32_t>(256, -1);
+  std::vector<int32_t> m_driven = std::vector<int32_t>(256, 0);
 };
 
 }  // namespace tav

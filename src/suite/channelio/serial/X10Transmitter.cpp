@@ -76,13 +76,11 @@ void X10Transmitter::SetLevel(int32_t house, int32_t unit, uint8_t level) {
 void X10Transmitter::SetLevels(std::span<const uint8_t> levels) {
   const size_t count = std::min<size_t>(levels.size(), m_levels.size());
   for (size_t i = 0; i < count; ++i) {
-    if (m_levelsKnown && levels[i] == m_levels[i]) continue;
+    if (levels[i] == m_levels[i]) continue;
     m_levels[i] = levels[i];
-    // Lamps start dark: a first frame of zeros sends nothing.
     m_queue.SetTarget(static_cast<int32_t>(i / 16) + 1, static_cast<int32_t>(i % 16) + 1,
                       X10StepsForLevel(levels[i]));
   }
-  m_levelsKnown = true;
   m_protocol.Pump(m_clock.TickCount());
   AfterProtocol();
 }

@@ -54,7 +54,8 @@ class X10Transmitter {
   // One unit's level (house and unit 1-16, level 0-255).
   void SetLevel(int32_t house, int32_t unit, uint8_t level);
   // All 256 units, house-major: (house - 1) * 16 + (unit - 1). Only units
-  // whose level changed since the last call are looked at.
+  // whose level changed since the last call are looked at; every lamp
+  // starts dark.
   void SetLevels(std::span<const uint8_t> levels);
 
   void SetOnReceived(std::function<void(const X10Received&)> handler);
@@ -77,7 +78,6 @@ class X10Transmitter {
   Cm11aProtocol m_protocol;
   OneShotTimer m_timer;
   std::vector<uint8_t> m_levels = std::vector<uint8_t>(256, 0);
-  bool m_levelsKnown = false;
   size_t m_warnAt;
   std::function<void(const X10Received&)> m_onReceived;
 };

@@ -227,7 +227,8 @@ void Cm11aModel::Apply(const ModelTransmission& t) {
       m_addressed[house].clear();
       m_functionSeen[house] = false;
     }
-    m_addressed[house].push_back(t.unit);
+    auto& units = m_addressed[house];
+    if (std::find(units.begin(), units.end(), t.unit) == units.end()) units.push_back(t.unit);
     return;
   }
   m_functionSeen[house] = true;
