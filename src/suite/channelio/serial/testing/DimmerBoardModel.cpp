@@ -74,6 +74,7 @@ void DimmerBoardModel::Data(uint8_t value, std::vector<uint8_t>& output, bool es
       if (m_taken == m_taking.size()) {
         m_channels = m_taking;
         ++m_frames;
+        if (m_onFrame) m_onFrame(m_channels);
         m_state = State::kPassRest;
         m_headerSent = false;
       }

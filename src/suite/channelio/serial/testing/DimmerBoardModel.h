@@ -15,6 +15,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <functional>
 #include <span>
 #include <vector>
 
@@ -24,6 +25,10 @@ class DimmerBoardModel {
  public:
   explicit DimmerBoardModel(size_t channels) : m_channels(channels, 0), m_taking(channels, 0) {}
 
+  // Called with the board's channels each time it completes a frame.
+  void SetOnFrame(std::function<void(const std::vector<uint8_t>&)> handler) {
+    m_onFrame = std::move(handler);
+  }
   // Parses `input`; appends what the board passes on to `output`.
   void Feed(std::span<const uint8_t> input, std::vector<uint8_t>& output);
 
@@ -51,6 +56,7 @@ class DimmerBoardModel {
   size_t m_pads = 0;
   size_t m_run = 0;
   size_t m_longestRun = 0;
+  std::function<void(const std::vector<uint8_t>&)> m_onFrame;
 };
 
 class DimmerChainModel {
@@ -59,6 +65,7 @@ class DimmerChainModel {
 
   void Feed(std::span<const uint8_t> bytes);
   const DimmerBoardModel& Board(size_t index) const { return m_boards[index]; }
+  DimmerBoardModel& Board(size_t index) { return m_boards[index]; }
   size_t Boards() const { return m_boards.size(); }
   // Every board's channels, board 1 first.
   std::vector<uint8_t> AllChannels() const;
