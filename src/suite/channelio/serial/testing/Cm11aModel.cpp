@@ -1,6 +1,7 @@
 #include "suite/channelio/serial/testing/Cm11aModel.h"
 
 #include <algorithm>
+#include <cmath>
 
 namespace tav {
 namespace {
@@ -217,7 +218,8 @@ void Cm11aModel::Transmit(uint64_t nowMs) {
   // One X10 frame: 11 cycles twice and a 3-cycle gap; each further dim step
   // one more 11-cycle frame. Then the 0x00 and 0x55 bytes on the serial line.
   double cycles = 25.0 + (t.dimSteps > 1 ? (t.dimSteps - 1) * 11.0 : 0.0);
-  m_doneAt = nowMs + static_cast<uint64_t>(cycles * 1000.0 / m_timing.lineHz + 2 * kByteMs);
+  m_doneAt =
+      nowMs + static_cast<uint64_t>(std::ceil(cycles * 1000.0 / m_timing.lineHz + 2 * kByteMs));
 }
 
 void Cm11aModel::Apply(const ModelTransmission& t) {
