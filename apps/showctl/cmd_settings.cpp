@@ -13,13 +13,13 @@
 #include <optional>
 #include <sstream>
 
+#include "ArgumentValues.h"
 #include "CommandRegistry.h"
+#include "SettingsStore.h"
 #include "config/LibRegistry.h"
 #include "config/RegistryFileFormat.h"
 #include "config/Settings.h"
 #include "platform/FileRegistryStore.h"
-#include "platform/PlatformPaths.h"
-#include "support/Numbers.h"
 
 namespace tav::showctl {
 namespace {
@@ -35,14 +35,8 @@ struct SettingsOptions {
   bool skipBadLines = false;
 };
 
-std::string SettingsFile(const SettingsOptions& o) {
-  return o.file.empty() ? RegistryFilePath() : o.file;
-}
-
 FileRegistryStore OpenStore(const SettingsOptions& o) {
-  return FileRegistryStore(SettingsFile(o), [](const std::string& problem) {
-    std::cerr << "showctl: warning: " << problem << "\n";
-  });
+  return OpenSettingsStore(o.file);
 }
 
 const SettingDescription* FindKnown(const std::string& name,
@@ -102,23 +96,6 @@ void Get(const SettingsOptions& o) {
   }
   throw CommandFailed(
       fmt::format("no setting \"{}\" in section \"{}\" of {}", o.name, section, store.Path()));
-}
-
-bool ParseBoolean(const std::string& text) {
-  std::string lower;
-  for (char c : text) lower += static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
-  if (lower == "true" || lower == "yes" || lower == "on" || lower == "1") return true;
-  if (lower == "false" || lower == "no" || lower == "off" || lower == "0") return false;
-  throw CommandFailed(fmt::format("\"{}\" is not a boolean (true or false)", text));
-}
-
-int32_t ParseLong(const std::string& text) {
-  std::optional<double> number = ParseNumber(text);
-  if (!number || *number != static_cast<double>(static_cast<int64_t>(*number)) ||
-      *number < -2147483648.0 || *number > 2147483647.0) {
-    throw CommandFailed(fmt::format("\"{}\" is not a whole number of 32 bits", text));
-  }
-  return static_cast<int32_t>(*number);
 }
 
 void Set(const SettingsOptions& o) {

@@ -11,6 +11,7 @@
 #include <optional>
 #include <string>
 
+#include "ArgumentValues.h"
 #include "CommandRegistry.h"
 #include "host/Msg.h"
 #include "platform/UnixTrayLink.h"
@@ -232,6 +233,22 @@ std::string OnDemandRequest(const OnDemandOptions& o) {
   return event->Serialize();
 }
 
+// Network, unit and input: whole numbers of 0 or more.
+struct TriggerOptions {
+  std::string network, unit, input;
+};
+
+int32_t InputPart(const char* what, const std::string& text) {
+  int32_t value = ParseLong(text, what);
+  if (value < 0) throw CommandFailed(fmt::format("{}: {} is below 0", what, value));
+  return value;
+}
+
+std::string TriggerRequest(const TriggerOptions& o) {
+  return SimulatedInputText(
+      {InputPart("NETWORK", o.network), InputPart("UNIT", o.unit), InputPart("INPUT", o.input)});
+}
+
 const char* kNotRunningNote =
     "Talks to the player at $TAV_TRAY_SOCKET, else "
     "$XDG_RUNTIME_DIR/tessavar/showplayer.sock, else /tmp/tessavar-<uid>/showplayer.sock.";
@@ -286,6 +303,21 @@ CommandGroup reg{
       shutdown->footer(kNotRunningNote);
       shutdown->callback(
           [now] { SendRequest(*now ? kMsgImmediateShutdown : kMsgGracefulShutdown); });
+
+      auto input = std::make_shared<TriggerOptions>();
+      auto* trigger = app.add_subcommand(
+          "trigger",
+          "Fire an input of the running player as if the hardware had raised it, to try "
+          "interactive shows and startup triggers without the hardware");
+      trigger
+          ->add_option("NETWORK", input->network,
+                       "The network the input is on, as the show's trigger names it")
+          ->required();
+      trigger->add_option("UNIT", input->unit, "The unit (controller) id")->required();
+      trigger->add_option("INPUT", input->input, "The input (circuit) number on that unit")
+          ->required();
+      trigger->footer(kNotRunningNote);
+      trigger->callback([input] { SendRequest(kMsgSimulateInput, TriggerRequest(*input)); });
     }};
 
 }  // namespace

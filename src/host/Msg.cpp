@@ -60,4 +60,19 @@ std::string SequenceNoticeText(const SequenceIdentity& seqInfo, DateTime now) {
       {EscapeText(seqInfo.Filename()), LongToText(seqInfo.Section()), DateToText(now)});
 }
 
+std::string SimulatedInputText(const SimulatedInput& input) {
+  return ListToText(
+      {LongToText(input.network), LongToText(input.unitId), LongToText(input.inputNumber)});
+}
+
+SimulatedInput SimulatedInputFromText(std::string_view body) {
+  TextArray fields = ListFromText(body, 0);
+  int32_t count = ArrayCount(fields);
+  if (count != 3) {
+    throw Error(37, "Msg.SimulatedInputFromText",
+                "Unexpected number of fields in simulated input: " + std::to_string(count));
+  }
+  return {LongFromText(fields[0]), LongFromText(fields[1]), LongFromText(fields[2])};
+}
+
 }  // namespace tav

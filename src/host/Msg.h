@@ -22,7 +22,7 @@ namespace tav {
 // dwData of every frame the player sends.
 constexpr uint32_t kCopyDataTag = 3;
 
-// Message types. Types 6 and 12 are not used.
+// Message types. Types 6, 12 and 15 to 19 are not used.
 constexpr int32_t kMsgImmediateShutdown = 1;   // tray to player
 constexpr int32_t kMsgTrayIntroduction = 2;    // tray to player
 constexpr int32_t kMsgCurrentShow = 3;         // player to tray
@@ -35,6 +35,7 @@ constexpr int32_t kMsgPlayerReady = 10;        // player to tray
 constexpr int32_t kMsgLeaveOnDemandOnly = 11;  // tray to player
 constexpr int32_t kMsgSequenceStart = 13;      // player to tray
 constexpr int32_t kMsgSequenceStop = 14;       // player to tray
+constexpr int32_t kMsgSimulateInput = 20;      // tray to player
 
 // The two-digit type prefix followed by the body.
 std::string TypedMessageText(int32_t type, std::string_view body);
@@ -57,5 +58,19 @@ TAVMessage DecodeReceivedMessage(const TrayFrame& frame);
 // The body of the sequence start and stop messages: the list of the escaped
 // file name, the section and the date and time `now`.
 std::string SequenceNoticeText(const SequenceIdentity& seqInfo, DateTime now);
+
+// An input a tray fires as if the hardware had raised it.
+struct SimulatedInput {
+  int32_t network = 0;
+  int32_t unitId = 0;
+  int32_t inputNumber = 0;
+  friend bool operator==(const SimulatedInput&, const SimulatedInput&) = default;
+};
+// The body of the simulate-input message: the list of the network, the unit
+// and the input number, " 0" style numbers: "( 0, 3, 12)".
+std::string SimulatedInputText(const SimulatedInput& input);
+// Fails with the list errors (1-4), with 37 when the list does not hold
+// exactly three fields, and with 13 or 6 for a field that is no 32-bit number.
+SimulatedInput SimulatedInputFromText(std::string_view body);
 
 }  // namespace tav

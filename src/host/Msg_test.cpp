@@ -4,6 +4,7 @@
 
 #include "host/testing/TrayLinkPair.h"
 #include "support/Error.h"
+#include "support/testing/Failure.h"
 
 namespace tav {
 namespace {
@@ -101,6 +102,36 @@ TEST(Msg, SequenceNoticeIsTheEscapedFileTheSectionAndTheDate) {
   FakeSequence seq;
   EXPECT_EQ(SequenceNoticeText(seq, DateTime::FromParts(2024, 12, 24, 18, 0, 5)),
             "(C:\\Shows\\a*Sb *O1*C.seq, 3,2024-12-24 18:00:05)");
+}
+
+TEST(Msg, SimulatedInputIsAListOfThreeNumbers) {
+  EXPECT_EQ(SimulatedInputText({0, 3, 12}), "( 0, 3, 12)");
+  for (SimulatedInput input : {SimulatedInput{0, 0, 0}, SimulatedInput{15, 127, 512},
+                               SimulatedInput{-1, 2147483647, -2147483647 - 1}}) {
+    EXPECT_EQ(SimulatedInputFromText(SimulatedInputText(input)), input);
+  }
+  // Written by hand: no blanks, text around the list.
+  EXPECT_EQ(SimulatedInputFromText("x(2,5,7)"), (SimulatedInput{2, 5, 7}));
+}
+
+TEST(Msg, AMalformedSimulatedInputFailsWithTheRecordOrNumberError) {
+  const struct {
+    std::string body;
+    int32_t number;
+    std::string description;
+  } cases[] = {
+      {"", 37, "Unexpected number of fields in simulated input: 0"},
+      {"( 1, 2)", 37, "Unexpected number of fields in simulated input: 2"},
+      {"( 1, 2, 3, 4)", 37, "Unexpected number of fields in simulated input: 4"},
+      {"( 1,two, 3)", 13, "Type mismatch"},
+      {"( 1, 2, 99999999999)", 6, "Overflow"},
+      {"( 1, 2, 3", 1, "Badly formatted list, enclosing parens"},
+  };
+  for (const auto& c : cases) {
+    testing::Failure f = testing::FailureOf([&] { SimulatedInputFromText(c.body); });
+    EXPECT_EQ(f.number, c.number) << c.body;
+    EXPECT_EQ(f.description, c.description) << c.body;
+  }
 }
 
 }  // namespace

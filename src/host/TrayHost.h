@@ -26,6 +26,10 @@ class TrayHost {
   // demand. Handles and logs its own failures.
   virtual void ShowOnDemand(const std::string& szSerialized) = 0;
   virtual void SetOnDemandOnly(bool value) = 0;
+  // Fires input `inputNumber` of unit `unitId` on `network` as if the
+  // hardware had raised it, for trying a show without the hardware. An input
+  // no show listens to is ignored, as a real one would be.
+  virtual void SimulateInput(int32_t network, int32_t unitId, int32_t inputNumber) = 0;
   // Set once the start-up delay is over.
   virtual bool Initialized() const = 0;
 

@@ -120,6 +120,12 @@ void TrayMessaging::tmrTAVMsgQueue_Timer() {
         case kMsgLeaveOnDemandOnly:
           m_host.SetOnDemandOnly(false);
           break;
+        case kMsgSimulateInput: {
+          // A malformed body fails here, before the host is asked anything.
+          SimulatedInput input = SimulatedInputFromText(message.Text());
+          m_host.SimulateInput(input.network, input.unitId, input.inputNumber);
+          break;
+        }
         default:
           // Player-to-tray types echoed back and unknown types mean nothing here.
           break;

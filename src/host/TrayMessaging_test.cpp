@@ -43,6 +43,10 @@ struct FakeHost : TrayHost {
   void SetOnDemandOnly(bool value) override {
     calls.push_back(value ? "SetOnDemandOnly:true" : "SetOnDemandOnly:false");
   }
+  void SimulateInput(int32_t network, int32_t unitId, int32_t inputNumber) override {
+    calls.push_back("SimulateInput:" + std::to_string(network) + "," + std::to_string(unitId) +
+                    "," + std::to_string(inputNumber));
+  }
   bool Initialized() const override { return initialized; }
   std::shared_ptr<MonitoredShowEvent> CurrentShowEvent(DateTime) override { return scheduled; }
   std::shared_ptr<MonitoredShowEvent> RunningShowEvent() override { return running; }
@@ -127,6 +131,7 @@ TEST_F(TrayMessagingTest, EachRequestTypeReachesTheHostAndEveryOtherTypeIsIgnore
       {9, "(Xmas,(F,,F,), 3,F)", {"ShowOnDemand:(Xmas,(F,,F,), 3,F)"}},
       {9, "", {"ShowOnDemand:"}},
       {11, "", {"SetOnDemandOnly:false"}},
+      {20, "( 2, 5, 12)", {"SimulateInput:2,5,12"}},
   };
   auto& tray = link.Connect();
   for (const auto& c : cases) {
@@ -136,10 +141,10 @@ TEST_F(TrayMessagingTest, EachRequestTypeReachesTheHostAndEveryOtherTypeIsIgnore
     EXPECT_EQ(host.calls, c.calls) << "type " << c.type;
   }
   host.calls.clear();
-  for (int32_t type : {0, 3, 4, 6, 7, 10, 12, 13, 14, 99}) Send(tray, type, "body");
+  for (int32_t type : {0, 3, 4, 6, 7, 10, 12, 13, 14, 15, 19, 21, 99}) Send(tray, type, "body");
   tray.Send(TrayFrame{0, 3, "\0"s});  // an empty text: type 0
   tray.Send(TrayFrame{0, 3, "-1\0"s});
-  EXPECT_EQ(messaging.MessageQueue().Count(), 12);
+  EXPECT_EQ(messaging.MessageQueue().Count(), 15);
   timers.Advance(1);
   EXPECT_TRUE(host.calls.empty());
   EXPECT_EQ(messaging.MessageQueue().Count(), 0);
@@ -227,6 +232,20 @@ TEST_F(TrayMessagingTest, AFailingRequestIsLoggedAndTheRestIsDrainedOnTheNextTic
   EXPECT_EQ(messaging.MessageQueue().Count(), 1);
   timers.Advance(1);
   EXPECT_EQ(host.calls, (std::vector<std::string>{"GracefulShutdown"}));
+  EXPECT_FALSE(messaging.tmrTAVMsgQueue().Enabled());
+}
+
+TEST_F(TrayMessagingTest, AMalformedSimulatedInputIsLoggedAndTheRestStillReachesTheHost) {
+  auto& tray = link.Connect();
+  Send(tray, kMsgSimulateInput, "( 2, 5)");
+  Send(tray, kMsgSimulateInput, "( 2,five, 12)");
+  Send(tray, kMsgSimulateInput, "( 2, 5, 12)");
+  timers.Advance(3);
+  EXPECT_EQ(log.Pending().Text(),
+            "18:30:00: tmrTAVMsgQueue_Timer Error: Unexpected number of fields in simulated "
+            "input: 2\r\n"
+            "18:30:00: tmrTAVMsgQueue_Timer Error: Type mismatch");
+  EXPECT_EQ(host.calls, (std::vector<std::string>{"SimulateInput:2,5,12"}));
   EXPECT_FALSE(messaging.tmrTAVMsgQueue().Enabled());
 }
 

@@ -45,6 +45,29 @@ class ShowctlTest : public ::testing::Test {
   // Arguments are quoted for the shell; the settings file and user data
   // folder point into the temporary folder.
   Result Run(const std::vector<std::string>& args, const std::string& input = "") const {
+    Write(".stdin", input);
+    int status = std::system((Command(args) + " <.stdin >.stdout 2>.stderr").c_str());
+    Result r;
+    r.exitCode = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+    r.out = Read(".stdout");
+    r.err = Read(".stderr");
+    return r;
+  }
+
+  // Starts every command at once and waits for all; true when all of them
+  // exited with 0.
+  bool RunAtOnce(const std::vector<std::vector<std::string>>& commands) const {
+    std::string script;
+    for (size_t i = 0; i < commands.size(); ++i) {
+      script += "(" + Command(commands[i]) + " >/dev/null 2>.stderr" + std::to_string(i) +
+                " || echo failed >.failed) & ";
+    }
+    std::system((script + "wait").c_str());
+    return !std::filesystem::exists(Path(".failed"));
+  }
+
+ private:
+  std::string Command(const std::vector<std::string>& args) const {
     std::string command = "cd '" + m_dir + "' && TAV_REGISTRY_FILE='" + Path("registry.reg") +
                           "' XDG_DATA_HOME='" + m_dir + "' XDG_RUNTIME_DIR='" + m_dir +
                           "' TAV_TRAY_SOCKET='" + Path("no.sock") + "' " + TAV_SHOWCTL_PATH;
@@ -53,16 +76,10 @@ class ShowctlTest : public ::testing::Test {
       for (char c : arg) quoted += c == '\'' ? std::string("'\\''") : std::string(1, c);
       command += " '" + quoted + "'";
     }
-    Write(".stdin", input);
-    command += " <.stdin >.stdout 2>.stderr";
-    int status = std::system(command.c_str());
-    Result r;
-    r.exitCode = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
-    r.out = Read(".stdout");
-    r.err = Read(".stderr");
-    return r;
+    return command;
   }
 
+ protected:
   std::string m_dir;
 };
 

@@ -53,6 +53,10 @@ struct RecordingHost : TrayHost {
   void SetOnDemandOnly(bool value) override {
     calls.push_back(std::string("SetOnDemandOnly:") + (value ? "true" : "false"));
   }
+  void SimulateInput(int32_t network, int32_t unitId, int32_t inputNumber) override {
+    calls.push_back("SimulateInput:" + std::to_string(network) + "," + std::to_string(unitId) +
+                    "," + std::to_string(inputNumber));
+  }
   bool Initialized() const override { return true; }
   std::shared_ptr<MonitoredShowEvent> CurrentShowEvent(DateTime) override { return scheduled; }
   std::shared_ptr<MonitoredShowEvent> RunningShowEvent() override { return nullptr; }
@@ -240,6 +244,8 @@ TEST_F(TrayEndToEnd, RequestsReachTheHost) {
       {{"schedules-on"}, "SetOnDemandOnly:false"},
       {{"shutdown"}, "GracefulShutdown"},
       {{"shutdown", "--now"}, "ImmediateShutdown:Immediate shutdown requested"},
+      {{"trigger", "0", "3", "12"}, "SimulateInput:0,3,12"},
+      {{"trigger", "15", "127", "512"}, "SimulateInput:15,127,512"},
   };
   for (const auto& c : cases) {
     host.calls.clear();
@@ -257,6 +263,10 @@ TEST_F(TrayEndToEnd, WrongInputIsRefusedBeforeAnythingIsSent) {
       {"ondemand", "x.tss", "--from", "tomorrow"},
       {"ondemand", "x.tss", "--from", "2024-12-24 18:00:00", "--until", "2024-12-24 17:00:00"},
       {"shutdown", "--later"},
+      {"trigger", "0", "3"},
+      {"trigger", "0", "3", "twelve"},
+      {"trigger", "-1", "3", "12"},
+      {"trigger", "0", "3", "12", "13"},
   };
   for (const auto& args : cases) {
     auto child = Start(args);
@@ -275,7 +285,8 @@ TEST_F(TrayEndToEnd, EveryCommandSaysSoWhenThePlayerIsNotRunning) {
                                                {"reload"},
                                                {"schedules-on"},
                                                {"shutdown"},
-                                               {"shutdown", "--now"}}) {
+                                               {"shutdown", "--now"},
+                                               {"trigger", "0", "1", "1"}}) {
     auto child = Start(args);
     EXPECT_EQ(Run(*child), 1) << args[0];
     EXPECT_TRUE(Contains(child->err, "The show player is not running")) << child->err;

@@ -1,0 +1,16 @@
+#pragma once
+// The settings file as showctl commands open it: the file given with --file,
+// else the one the player reads ($TAV_REGISTRY_FILE, else the user's config
+// folder). Lines the store cannot read are reported on standard error as
+// warnings and otherwise left alone.
+
+#include <string>
+
+#include "platform/FileRegistryStore.h"
+
+namespace tav::showctl {
+
+// `file` empty: the usual settings file.
+FileRegistryStore OpenSettingsStore(const std::string& file);
+
+}  // namespace tav::showctl
