@@ -26,7 +26,7 @@ std::string OneDecimal(double value) {
 
 DimmerTransmitter::DimmerTransmitter(DimmerNetworkSettings settings,
                                      std::unique_ptr<SerialLink> link, TimerService& timers,
-                                     Clock& clock, MessageLog& log)
+                                     const Clock& clock, MessageLog& log)
     : m_settings(std::move(settings)),
       m_encoder(m_settings.layout),
       m_sender(SenderOptions(m_settings), std::move(link), timers, clock, log) {

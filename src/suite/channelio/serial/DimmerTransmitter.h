@@ -34,7 +34,7 @@ class DimmerTransmitter {
  public:
   // Fails like DimmerFrameEncoder for a layout it cannot frame.
   DimmerTransmitter(DimmerNetworkSettings settings, std::unique_ptr<SerialLink> link,
-                    TimerService& timers, Clock& clock, MessageLog& log);
+                    TimerService& timers, const Clock& clock, MessageLog& log);
 
   // The levels of the network's channels, board 1 channel 1 first.
   void SendLevels(std::span<const uint8_t> levels);

@@ -12,7 +12,7 @@ constexpr uint32_t kRetryMs = 2;
 }  // namespace
 
 SerialFrameSender::SerialFrameSender(FrameSenderOptions options, std::unique_ptr<SerialLink> link,
-                                     TimerService& timers, Clock& clock, MessageLog& log)
+                                     TimerService& timers, const Clock& clock, MessageLog& log)
     : m_options(std::move(options)),
       m_link(std::move(link)),
       m_clock(clock),

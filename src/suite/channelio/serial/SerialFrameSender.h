@@ -59,7 +59,7 @@ inline constexpr int64_t kFrameSenderSlackMicros = 3000;
 class SerialFrameSender {
  public:
   SerialFrameSender(FrameSenderOptions options, std::unique_ptr<SerialLink> link,
-                    TimerService& timers, Clock& clock, MessageLog& log);
+                    TimerService& timers, const Clock& clock, MessageLog& log);
   SerialFrameSender(const SerialFrameSender&) = delete;
   SerialFrameSender& operator=(const SerialFrameSender&) = delete;
 
@@ -77,7 +77,7 @@ class SerialFrameSender {
 
   FrameSenderOptions m_options;
   std::unique_ptr<SerialLink> m_link;
-  Clock& m_clock;
+  const Clock& m_clock;
   MessageLog& m_log;
   LinePacer m_pacer;
   OneShotTimer m_timer;

@@ -37,7 +37,7 @@ SerialSettings UsbDmxTransmitter::PortSettings(const UsbDmxSettings& settings) {
 }
 
 UsbDmxTransmitter::UsbDmxTransmitter(UsbDmxSettings settings, std::unique_ptr<SerialLink> link,
-                                     TimerService& timers, Clock& clock, MessageLog& log)
+                                     TimerService& timers, const Clock& clock, MessageLog& log)
     : m_settings(std::move(settings)),
       m_sender(SenderOptions(m_settings), std::move(link), timers, clock, log) {}
 

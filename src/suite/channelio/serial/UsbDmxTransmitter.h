@@ -36,7 +36,7 @@ class UsbDmxTransmitter {
   static SerialSettings PortSettings(const UsbDmxSettings& settings);
 
   UsbDmxTransmitter(UsbDmxSettings settings, std::unique_ptr<SerialLink> link, TimerService& timers,
-                    Clock& clock, MessageLog& log);
+                    const Clock& clock, MessageLog& log);
 
   // The universe's slots, slot 1 first.
   void SendLevels(std::span<const uint8_t> slots);

@@ -21,7 +21,7 @@ SerialSettings X10Transmitter::PortSettings(const X10NetworkSettings& settings) 
 }
 
 X10Transmitter::X10Transmitter(X10NetworkSettings settings, std::unique_ptr<SerialLink> link,
-                               TimerService& timers, Clock& clock, MessageLog& log)
+                               TimerService& timers, const Clock& clock, MessageLog& log)
     : m_settings(std::move(settings)),
       m_link(std::move(link)),
       m_clock(clock),

@@ -46,7 +46,7 @@ class X10Transmitter {
   static SerialSettings PortSettings(const X10NetworkSettings& settings);
 
   X10Transmitter(X10NetworkSettings settings, std::unique_ptr<SerialLink> link,
-                 TimerService& timers, Clock& clock, MessageLog& log);
+                 TimerService& timers, const Clock& clock, MessageLog& log);
   ~X10Transmitter();
   X10Transmitter(const X10Transmitter&) = delete;
   X10Transmitter& operator=(const X10Transmitter&) = delete;
@@ -72,7 +72,7 @@ class X10Transmitter {
 
   X10NetworkSettings m_settings;
   std::unique_ptr<SerialLink> m_link;
-  Clock& m_clock;
+  const Clock& m_clock;
   MessageLog& m_log;
   X10SendQueue m_queue;
   Cm11aProtocol m_protocol;
