@@ -7,6 +7,7 @@
 #include <cstdlib>
 
 #include "CommandRegistry.h"
+#include "SettingsStore.h"
 #include "config/MemoryRegistryStore.h"
 
 namespace tav::showctl {
@@ -116,6 +117,7 @@ NetworkEditResult EditNetworkPreferences(FileRegistryStore& store,
   if (status != kRegistryOk && status != kNothingToWrite) {
     throw CommandFailed(fmt::format("could not write {}; it was left unchanged", store.Path()));
   }
+  FinishWriting(store);
   return result;
 }
 

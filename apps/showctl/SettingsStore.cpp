@@ -1,6 +1,11 @@
 #include "SettingsStore.h"
 
+#include <fmt/format.h>
+
+#include <chrono>
 #include <iostream>
+
+#include "CommandRegistry.h"
 
 #include "platform/PlatformPaths.h"
 
@@ -10,6 +15,13 @@ FileRegistryStore OpenSettingsStore(const std::string& file) {
   return FileRegistryStore(
       file.empty() ? RegistryFilePath() : file,
       [](const std::string& problem) { std::cerr << "showctl: warning: " << problem << "\n"; });
+}
+
+void FinishWriting(FileRegistryStore& store) {
+  if (store.WritePendingChanges(std::chrono::seconds(5))) return;
+  store.DropPendingChanges();
+  throw CommandFailed(fmt::format(
+      "could not write {}: another program kept it locked; it was left unchanged", store.Path()));
 }
 
 }  // namespace tav::showctl

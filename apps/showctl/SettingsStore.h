@@ -13,4 +13,9 @@ namespace tav::showctl {
 // `file` empty: the usual settings file.
 FileRegistryStore OpenSettingsStore(const std::string& file);
 
+// The store never waits for its lock (the player must not), so a command
+// that changed something waits here, a few seconds at most, and reports a
+// change it could not write rather than success.
+void FinishWriting(FileRegistryStore& store);
+
 }  // namespace tav::showctl

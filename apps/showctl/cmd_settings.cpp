@@ -6,6 +6,7 @@
 
 #include <fmt/format.h>
 
+#include <chrono>
 #include <cstdio>
 #include <fstream>
 #include <iostream>
@@ -114,6 +115,7 @@ void Set(const SettingsOptions& o) {
   } else {
     SetStringSetting(store, o.name, section, o.value);
   }
+  FinishWriting(store);
 }
 
 void ListKey(FileRegistryStore& store, const std::string& key, const std::string& prefix) {
@@ -196,6 +198,7 @@ void Import(const SettingsOptions& o) {
   if (status != kRegistryOk) {
     throw CommandFailed(fmt::format("could not write {}; it was left unchanged", store.Path()));
   }
+  FinishWriting(store);
   std::cout << fmt::format("imported {} value{} into {}\n", values, values == 1 ? "" : "s",
                            store.Path());
 }

@@ -2,11 +2,10 @@
 // An object whose operations can be called by their name, with no
 // arguments, as the registry watcher calls its callback. The host form
 // implements it for "DoUpdateNetworkPrefsFromRegistry"; a name it does not
-// know should fail with UnknownOperationError.
+// know should fail as the platform does: tav::Error 438, "Object doesn't
+// support this property or method".
 
 #include <string>
-
-#include "support/Error.h"
 
 namespace tav {
 
@@ -15,10 +14,5 @@ class CallableByName {
   virtual ~CallableByName() = default;
   virtual void CallByName(const std::string& name) = 0;
 };
-
-// The platform's error 438, "Object doesn't support this property or method".
-inline Error UnknownOperationError(const std::string& source) {
-  return Error(438, source, "Object doesn't support this property or method");
-}
 
 }  // namespace tav

@@ -44,6 +44,13 @@ bool IsText(const RegistryValue& value) {
   return value.type == kRegSz || value.type == kRegExpandSz;
 }
 
+// Settings are text or 32-bit numbers; anything else cannot be read as one.
+void CheckReadable(const RegistryValue& value) {
+  if (!IsText(value) && !value.IsDword()) {
+    throw Error(kRegistryInvalidParameter, "LibRegistry.RegistryGetValue", kGetValueFailure);
+  }
+}
+
 }  // namespace
 
 std::string SuiteKey(std::string_view subKey) {
@@ -153,42 +160,57 @@ RegistryKeyInfo RegistryQueryKeyInfo(RegistryStore& store, const std::string& ke
   return info;
 }
 
-std::optional<RegistryValue> RegistryGetValue(RegistryStore& store, const std::string& key,
-                                              const std::string& name) {
+std::optional<RegistryValue> RegistryGetStoredValue(RegistryStore& store, const std::string& key,
+                                                    const std::string& name) {
   if (!RegistryKeyExists(store, key)) return std::nullopt;
   if (!RegistryQueryValueLength(store, key, name)) return std::nullopt;
-  RegistryValue value = RegistryQueryValue(store, key, name);
-  if (!IsText(value) && !value.IsDword()) {
-    throw Error(kRegistryInvalidParameter, "LibRegistry.RegistryGetValue", kGetValueFailure);
-  }
+  return RegistryQueryValue(store, key, name);
+}
+
+std::optional<RegistryValue> RegistryGetValue(RegistryStore& store, const std::string& key,
+                                              const std::string& name) {
+  std::optional<RegistryValue> value = RegistryGetStoredValue(store, key, name);
+  if (value) CheckReadable(*value);
   return value;
 }
 
-bool GetBooleanSetting(RegistryStore& store, const std::string& szValueName,
-                       const std::string& szSection, bool boolDefault) {
-  auto value = RegistryGetValue(store, SharedSettingsKey(szSection), szValueName);
-  if (!value) return boolDefault;
-  if (value->IsDword()) return value->DwordValue() != 0;
-  std::string text = Upper(Trim(value->data));
+bool BooleanSettingOf(const RegistryValue& value) {
+  CheckReadable(value);
+  if (value.IsDword()) return value.DwordValue() != 0;
+  std::string text = Upper(Trim(value.data));
   if (text == "TRUE") return true;
   if (text == "FALSE") return false;
   return NumberFromText(text, "GetBooleanSetting") != 0;
 }
 
+int32_t LongSettingOf(const RegistryValue& value) {
+  CheckReadable(value);
+  if (value.IsDword()) return static_cast<int32_t>(value.DwordValue());
+  return NumberFromText(value.data, "GetLongSetting");
+}
+
+std::string StringSettingOf(const RegistryValue& value) {
+  CheckReadable(value);
+  if (value.IsDword()) return std::to_string(static_cast<int32_t>(value.DwordValue()));
+  return value.data;
+}
+
+bool GetBooleanSetting(RegistryStore& store, const std::string& szValueName,
+                       const std::string& szSection, bool boolDefault) {
+  auto value = RegistryGetStoredValue(store, SharedSettingsKey(szSection), szValueName);
+  return value ? BooleanSettingOf(*value) : boolDefault;
+}
+
 int32_t GetLongSetting(RegistryStore& store, const std::string& szValueName,
                        const std::string& szSection, int32_t lDefault) {
-  auto value = RegistryGetValue(store, SharedSettingsKey(szSection), szValueName);
-  if (!value) return lDefault;
-  if (value->IsDword()) return static_cast<int32_t>(value->DwordValue());
-  return NumberFromText(value->data, "GetLongSetting");
+  auto value = RegistryGetStoredValue(store, SharedSettingsKey(szSection), szValueName);
+  return value ? LongSettingOf(*value) : lDefault;
 }
 
 std::string GetStringSetting(RegistryStore& store, const std::string& szValueName,
                              const std::string& szSection, const std::string& szDefault) {
-  auto value = RegistryGetValue(store, SharedSettingsKey(szSection), szValueName);
-  if (!value) return szDefault;
-  if (value->IsDword()) return std::to_string(static_cast<int32_t>(value->DwordValue()));
-  return value->data;
+  auto value = RegistryGetStoredValue(store, SharedSettingsKey(szSection), szValueName);
+  return value ? StringSettingOf(*value) : szDefault;
 }
 
 namespace {

@@ -52,14 +52,26 @@ std::vector<std::string> RegistryEnumSubKeys(RegistryStore& store, const std::st
 std::vector<NamedRegistryValue> RegistryEnumValues(RegistryStore& store, const std::string& key);
 RegistryKeyInfo RegistryQueryKeyInfo(RegistryStore& store, const std::string& key);
 
+// The value as stored, of whatever type, if both key and value exist.
+std::optional<RegistryValue> RegistryGetStoredValue(RegistryStore& store, const std::string& key,
+                                                    const std::string& name);
 // The value if both key and value exist. A value that is neither text nor a
 // 32-bit number fails with "Error getting registry value".
 std::optional<RegistryValue> RegistryGetValue(RegistryStore& store, const std::string& key,
                                               const std::string& name);
 
-// Typed settings. Numbers read from text (a hand-edited file) convert as the
-// platform converts text to numbers, failing with the type-mismatch (13) or
-// overflow (6) error; booleans also accept "True" and "False".
+// A stored value read as a setting of each type. A value of another type
+// fails with "Error getting registry value" (87); numbers read from text (a
+// hand-edited file) convert as the platform converts text to numbers,
+// failing with the type-mismatch (13) or overflow (6) error; booleans also
+// accept "True" and "False"; a number read as a string is its decimal text.
+bool BooleanSettingOf(const RegistryValue& value);
+int32_t LongSettingOf(const RegistryValue& value);
+std::string StringSettingOf(const RegistryValue& value);
+
+// Typed settings: the default when the key or value is missing, else the
+// stored value read as above (failing as above). Failures of the registry
+// itself raise the primitives' errors.
 bool GetBooleanSetting(RegistryStore& store, const std::string& szValueName,
                        const std::string& szSection, bool boolDefault);
 int32_t GetLongSetting(RegistryStore& store, const std::string& szValueName,

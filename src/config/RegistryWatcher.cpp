@@ -1,6 +1,7 @@
 #include "config/RegistryWatcher.h"
 
 #include "config/LibRegistry.h"
+#include "support/Error.h"
 
 namespace tav {
 
@@ -24,7 +25,14 @@ void RegistryWatcher::SetEnabled(bool enabled) {
 
 std::string RegistryWatcher::ReadWatchedValue(const std::string& key,
                                               const std::string& value) const {
-  return GetStringSetting(m_store, value, key, "");
+  std::optional<RegistryValue> stored =
+      RegistryGetStoredValue(m_store, SharedSettingsKey(key), value);
+  if (!stored) return "";
+  try {
+    return StringSettingOf(*stored);
+  } catch (const Error&) {
+    return "";  // a value of another type has no text to watch
+  }
 }
 
 bool RegistryWatcher::EnableTheWatch() {

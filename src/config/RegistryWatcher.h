@@ -6,8 +6,9 @@
 //
 // The watched key is resolved as the string setting getter resolves a
 // section: below HKEY_CURRENT_USER\Software\Tessavar\Shared. A value that is
-// missing or empty never triggers the call and does not replace the last
-// text seen. A failure inside the callback propagates out of the tick, and
+// missing, empty or of a type that holds no text (binary, say) never
+// triggers the call and does not replace the last text seen; a number reads
+// as its decimal text. A failure inside the callback propagates out of the tick, and
 // the last text is then left alone, so the call is repeated on the next tick.
 //
 // Setters only store; EnableTheWatch copies them into the armed watch that

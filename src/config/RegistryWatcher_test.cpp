@@ -5,6 +5,7 @@
 #include "config/LibRegistry.h"
 #include "config/MemoryRegistryStore.h"
 #include "ports/testing/VirtualTimerService.h"
+#include "support/Error.h"
 
 namespace tav {
 namespace {
@@ -74,6 +75,25 @@ TEST_F(RegistryWatcherTest, ReappearingWithTheOldTextOrEmptyCallsNothing) {
   timers.Advance(2000);
   EXPECT_EQ(Calls(), 0u);
   Write("a");  // exact comparison: letter case counts
+  timers.Advance(1000);
+  EXPECT_EQ(Calls(), 1u);
+}
+
+TEST_F(RegistryWatcherTest, AValueOfAnotherTypeReadsAsEmpty) {
+  auto writeBinary = [&] {
+    RegistryCreateKey(store, SharedSettingsKey("Network"));
+    RegistrySetValue(store, SharedSettingsKey("Network"), "Ver", RegistryValue::Binary("\x01\x02"));
+  };
+  writeBinary();
+  EXPECT_FALSE(Arm());  // nothing to watch yet
+
+  Write("A");
+  ASSERT_TRUE(Arm());
+  writeBinary();
+  EXPECT_NO_THROW(timers.Advance(3000));
+  EXPECT_EQ(Calls(), 0u);
+  EXPECT_EQ(watcher.LastValue(), "A");
+  Write("B");
   timers.Advance(1000);
   EXPECT_EQ(Calls(), 1u);
 }

@@ -1,6 +1,7 @@
 #include "config/Settings.h"
 
 #include "config/LibRegistry.h"
+#include "support/Error.h"
 #include "support/Numbers.h"
 
 namespace tav {
@@ -49,20 +50,44 @@ const std::vector<SettingDescription>& KnownSettings() {
   return all;
 }
 
-Settings::Settings(RegistryStore& store, PathDefaults pathDefaults)
-    : m_store(store), m_pathDefaults(std::move(pathDefaults)) {}
+Settings::Settings(RegistryStore& store, PathDefaults pathDefaults, MessageLog* log)
+    : m_store(store), m_pathDefaults(std::move(pathDefaults)), m_log(log) {}
+
+template <typename T>
+T Settings::Read(std::string_view section, std::string_view name, T defaultValue,
+                 T (*convert)(const RegistryValue&), const std::string& defaultText) const {
+  std::string where =
+      section.empty() ? std::string(name) : std::string(section) + "\\" + std::string(name);
+  std::optional<RegistryValue> value =
+      RegistryGetStoredValue(m_store, SharedSettingsKey(section), std::string(name));
+  if (!value) {
+    m_warned.erase(where);
+    return defaultValue;
+  }
+  try {
+    T result = convert(*value);
+    m_warned.erase(where);
+    return result;
+  } catch (const Error& e) {
+    if (m_warned.insert(where).second && m_log) {
+      m_log->LogMessage(2, "Setting " + where + " cannot be read (" + e.Description() +
+                               "); using its default " + defaultText);
+    }
+    return defaultValue;
+  }
+}
 
 bool Settings::Get(const BooleanSetting& s) const {
-  return GetBooleanSetting(m_store, std::string(s.name), std::string(s.section), s.defaultValue);
+  return Read<bool>(s.section, s.name, s.defaultValue, BooleanSettingOf, Describe(s).defaultText);
 }
 
 int32_t Settings::Get(const LongSetting& s) const {
-  return GetLongSetting(m_store, std::string(s.name), std::string(s.section), s.defaultValue);
+  return Read<int32_t>(s.section, s.name, s.defaultValue, LongSettingOf, Describe(s).defaultText);
 }
 
 std::string Settings::Get(const StringSetting& s) const {
-  return GetStringSetting(m_store, std::string(s.name), std::string(s.section),
-                          std::string(s.defaultValue));
+  return Read<std::string>(s.section, s.name, std::string(s.defaultValue), StringSettingOf,
+                           "\"" + std::string(s.defaultValue) + "\"");
 }
 
 void Settings::Set(const BooleanSetting& s, bool value) {
@@ -78,7 +103,11 @@ void Settings::Set(const StringSetting& s, const std::string& value) {
 }
 
 int16_t Settings::MaxCommandsPerMessage() const {
-  return ToInt16(Get(settings::kMaxCommandsPerMessage));
+  const LongSetting& s = settings::kMaxCommandsPerMessage;
+  return Read<int16_t>(
+      s.section, s.name, static_cast<int16_t>(s.defaultValue),
+      [](const RegistryValue& value) { return ToInt16(LongSettingOf(value)); },
+      Describe(s).defaultText);
 }
 
 std::string Settings::NormalisedPath(const StringSetting& setting,

@@ -1,23 +1,32 @@
 #pragma once
 // The program's settings: every value it reads from the registry, each with
-// its section, name, type and default, listed once below, and typed
-// accessors over them. Values are read through the store at each use, so a
+// its section, name, type and default, listed once below, and one typed
+// accessor for each. Values are read through the store at each use, so a
 // change made by another program counts at the next read; only the two
 // folder paths are read once and kept for the life of the object.
+//
+// A value that is there but cannot be read as its setting's type (text
+// where a number belongs, "yes" for a boolean, a binary value, a number too
+// large) gives the setting's default, so one hand-edited mistake does not
+// stop every show; the log hears of it once per setting (a warning, level 2)
+// until the value reads again. Failures of the registry itself still raise.
 //
 // `UseCompressedSequences` lives in the section "Sequences", beside the
 // sequence folder settings of the sequence library.
 //
-// Owned by the host; the store must outlive it. The platform supplies the
-// folder defaults and separator (PathDefaults), so this stays free of the OS.
+// Owned by the host; the store and the log must outlive it. The platform
+// supplies the folder defaults and separator (PathDefaults), so this stays
+// free of the OS.
 
 #include <cstdint>
 #include <optional>
+#include <set>
 #include <string>
 #include <string_view>
 #include <vector>
 
 #include "config/RegistryStore.h"
+#include "ports/MessageLog.h"
 
 namespace tav {
 
@@ -86,11 +95,9 @@ struct PathDefaults {
 
 class Settings {
  public:
-  Settings(RegistryStore& store, PathDefaults pathDefaults);
+  // Warnings about unreadable values go to `log`; none are given without one.
+  Settings(RegistryStore& store, PathDefaults pathDefaults, MessageLog* log = nullptr);
 
-  bool Get(const BooleanSetting& setting) const;
-  int32_t Get(const LongSetting& setting) const;
-  std::string Get(const StringSetting& setting) const;
   void Set(const BooleanSetting& setting, bool value);
   void Set(const LongSetting& setting, int32_t value);
   void Set(const StringSetting& setting, const std::string& value);
@@ -116,7 +123,7 @@ class Settings {
   }
   int32_t RemotePort() const { return Get(settings::kRemotePort); }
   std::string RemoteHost() const { return Get(settings::kRemoteHost); }
-  // Kept as a 16-bit number: fails with the overflow error (6) outside it.
+  // Kept as a 16-bit number: a value outside it cannot be read.
   int16_t MaxCommandsPerMessage() const;
   int32_t MaxBytesPerMessage() const { return Get(settings::kMaxBytesPerMessage); }
   int32_t MaxDatagramSize() const { return Get(settings::kMaxDatagramSize); }
@@ -134,10 +141,21 @@ class Settings {
   std::string YearSchedulePath() const;
 
  private:
+  bool Get(const BooleanSetting& setting) const;
+  int32_t Get(const LongSetting& setting) const;
+  std::string Get(const StringSetting& setting) const;
+  // The stored value read by `convert`; the default when there is none or
+  // when it cannot be read (warned about once).
+  template <typename T>
+  T Read(std::string_view section, std::string_view name, T defaultValue,
+         T (*convert)(const RegistryValue&), const std::string& defaultText) const;
   std::string NormalisedPath(const StringSetting& setting, const std::string& fallback) const;
 
   RegistryStore& m_store;
   PathDefaults m_pathDefaults;
+  MessageLog* m_log;
+  // "section\name" of the settings warned about while unreadable.
+  mutable std::set<std::string> m_warned;
   mutable std::optional<std::string> m_appPath;
   mutable std::optional<std::string> m_userDataPath;
 };

@@ -7,9 +7,18 @@ void PendingLog::Append(std::string_view line) {
   m_text.append(line);
   if (m_text.size() < kTrimAt) return;
   m_text.erase(0, m_text.size() - kKeepAfterTrim);
-  // A line longer than what is kept has no break left and stays as it is.
   size_t lineBreak = m_text.find("\r\n");
-  if (lineBreak != std::string::npos) m_text.erase(0, lineBreak + 2);
+  if (lineBreak != std::string::npos) {
+    m_text.erase(0, lineBreak + 2);
+    return;
+  }
+  // A line longer than what is kept has no break left and stays as it is,
+  // but from a whole character: the tray must get valid UTF-8.
+  size_t start = 0;
+  while (start < m_text.size() && (static_cast<unsigned char>(m_text[start]) & 0xC0) == 0x80) {
+    ++start;
+  }
+  m_text.erase(0, start);
 }
 
 std::string PendingLog::Take() {

@@ -1,9 +1,11 @@
 #pragma once
 // Log lines held back while no tray program is known, oldest first, joined
 // by carriage return plus line feed. The buffer is bounded: when it reaches
-// kTrimAt characters it keeps its last kKeepAfterTrim characters, cut to
-// start at a whole line. Trimming to half the limit makes trimming rare while
-// a player runs for days without a tray. Owned by the host's log.
+// kTrimAt bytes it keeps its last kKeepAfterTrim bytes, cut to start at a
+// whole line, or, when one line is longer than that, at a whole UTF-8
+// character (so up to three bytes fewer). Limits count bytes, which is what
+// a tray message carries. Trimming to half the limit makes trimming rare
+// while a player runs for days without a tray. Owned by the host's log.
 
 #include <cstddef>
 #include <string>

@@ -76,5 +76,40 @@ TEST(PendingLog, AHugeLineWithoutABreakKeepsItsLastThirtyThousandCharacters) {
   EXPECT_EQ(log.Text().find("short"), std::string::npos);
 }
 
+// Whether `text` is whole UTF-8: no character cut at either end.
+bool IsWholeUtf8(const std::string& text) {
+  size_t i = 0;
+  while (i < text.size()) {
+    auto c = static_cast<unsigned char>(text[i]);
+    size_t length = c < 0x80           ? 1
+                    : (c >> 5) == 0x6  ? 2
+                    : (c >> 4) == 0xE  ? 3
+                    : (c >> 3) == 0x1E ? 4
+                                       : 0;
+    if (length == 0 || i + length > text.size()) return false;
+    for (size_t k = 1; k < length; ++k) {
+      if ((static_cast<unsigned char>(text[i + k]) & 0xC0) != 0x80) return false;
+    }
+    i += length;
+  }
+  return true;
+}
+
+TEST(PendingLog, AHugeLineIsNeverCutInsideACharacter) {
+  // Two, three and four bytes per character, cut at every offset inside one.
+  for (const std::string character : {"\xC3\xA9", "\xE2\x82\xAC", "\xF0\x9F\x8E\x84"}) {
+    for (size_t shift = 0; shift < character.size(); ++shift) {
+      PendingLog log;
+      std::string huge;
+      while (huge.size() < 70000) huge += character;
+      huge.append(shift, 'x');  // moves the cut, which counts from the end
+      log.Append(huge);
+      EXPECT_TRUE(IsWholeUtf8(log.Text())) << character.size() << " bytes, shift " << shift;
+      EXPECT_LE(log.Text().size(), PendingLog::kKeepAfterTrim);
+      EXPECT_GT(log.Text().size(), PendingLog::kKeepAfterTrim - character.size());
+    }
+  }
+}
+
 }  // namespace
 }  // namespace tav

@@ -1,18 +1,25 @@
 #include "platform/FileRegistryStore.h"
 
+#include <fcntl.h>
 #include <gtest/gtest.h>
+#include <sys/file.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <chrono>
 #include <csignal>
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
+#include <future>
 #include <sstream>
+#include <thread>
 
 #include "config/LibRegistry.h"
 #include "config/TextEncoding.h"
 #include "platform/PlatformPaths.h"
+#include "platform/PosixFiles.h"
+#include "ports/testing/VirtualTimerService.h"
 #include "support/Error.h"
 
 namespace tav {
@@ -179,6 +186,7 @@ TEST_F(FileRegistryStoreTest, TwoProcessesWritingAtOnceLoseNothing) {
           ++failures;
         }
       }
+      if (!store.WritePendingChanges(std::chrono::seconds(10))) ++failures;
       ::_exit(failures == 0 ? 0 : 1);
     }
     children.push_back(child);
@@ -200,7 +208,7 @@ TEST_F(FileRegistryStoreTest, TwoProcessesWritingAtOnceLoseNothing) {
   EXPECT_TRUE(problems.empty());
   // No temporary file was left behind.
   for (const auto& entry : fs::directory_iterator(fs::path(path).parent_path())) {
-    EXPECT_EQ(entry.path().string().find(".tmp."), std::string::npos) << entry.path();
+    EXPECT_EQ(entry.path().string().find("tav-tmp"), std::string::npos) << entry.path();
   }
 }
 
@@ -225,6 +233,92 @@ TEST_F(FileRegistryStoreTest, WriterKilledInsideItsTransactionLeavesTheFileAndLo
   EXPECT_EQ(GetStringSetting(store, "Kept", "", ""), "yes");
   FileRegistryStore fresh = MakeStore();
   EXPECT_EQ(GetStringSetting(fresh, "After", "", ""), "written");
+}
+
+// Another program in the middle of its transaction: it holds the lock.
+class LockHolder {
+ public:
+  explicit LockHolder(const std::string& settingsPath)
+      : m_fd(::open((settingsPath + ".lock").c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600)) {
+    EXPECT_GE(m_fd, 0);
+    EXPECT_EQ(::flock(m_fd, LOCK_EX), 0);
+  }
+  ~LockHolder() { Release(); }
+  void Release() {
+    if (m_fd >= 0) ::close(m_fd);
+    m_fd = -1;
+  }
+
+ private:
+  int m_fd;
+};
+
+TEST_F(FileRegistryStoreTest, AWriteNeverWaitsForTheLockAndIsWrittenWhenItIsFree) {
+  VirtualTimerService timers;
+  FileRegistryStore store(
+      path, [this](const std::string& p) { problems.push_back(p); }, &timers);
+  SetStringSetting(store, "Before", "", "1");
+  LockHolder other(path);
+
+  auto write = std::async(std::launch::async, [&] { SetStringSetting(store, "During", "", "2"); });
+  bool returned = write.wait_for(std::chrono::seconds(3)) == std::future_status::ready;
+  if (!returned) other.Release();  // let the stuck write finish before failing
+  write.get();
+  ASSERT_TRUE(returned) << "the write waited for another program's lock";
+
+  // The store answers with its own change at once; the file has not got it.
+  EXPECT_EQ(GetStringSetting(store, "During", "", ""), "2");
+  EXPECT_TRUE(store.HasPendingChanges());
+  EXPECT_EQ(GetStringSetting(*std::make_unique<FileRegistryStore>(path), "During", "", "-"), "-");
+  // The other program writes a value of its own before it lets go.
+  WriteRaw(ReadRaw() + "\"Other\"=\"3\"\r\n");
+  timers.Advance(1000);
+  EXPECT_TRUE(store.HasPendingChanges());
+
+  other.Release();
+  timers.Advance(FileRegistryStore::kRetryIntervalMs);
+  EXPECT_FALSE(store.HasPendingChanges());
+  FileRegistryStore fresh = MakeStore();
+  EXPECT_EQ(GetStringSetting(fresh, "Before", "", ""), "1");
+  EXPECT_EQ(GetStringSetting(fresh, "During", "", ""), "2");
+  EXPECT_EQ(GetStringSetting(fresh, "Other", "", ""), "3");
+  EXPECT_EQ(problems.size(), 1u);  // one note that the settings were locked
+}
+
+TEST_F(FileRegistryStoreTest, WithoutTimersAPendingWriteIsRetriedByLaterCallsAndAtTheEnd) {
+  auto store = std::make_unique<FileRegistryStore>(path);
+  SetStringSetting(*store, "Before", "", "1");
+  {
+    LockHolder other(path);
+    SetStringSetting(*store, "During", "", "2");
+    EXPECT_TRUE(store->HasPendingChanges());
+    EXPECT_FALSE(store->WritePendingChanges(std::chrono::milliseconds(20)));
+  }
+  EXPECT_EQ(GetStringSetting(*store, "During", "", ""), "2");  // a read tries again
+  EXPECT_FALSE(store->HasPendingChanges());
+
+  LockHolder briefly(path);
+  SetStringSetting(*store, "Last", "", "3");
+  std::thread releaser([&] {
+    std::this_thread::sleep_for(std::chrono::milliseconds(50));
+    briefly.Release();
+  });
+  store.reset();  // waits a bounded time for the lock
+  releaser.join();
+  EXPECT_EQ(GetStringSetting(*std::make_unique<FileRegistryStore>(path), "Last", "", ""), "3");
+}
+
+TEST_F(FileRegistryStoreTest, TemporariesLeftByACrashAreRemovedAtStart) {
+  pid_t gone = ::fork();
+  ASSERT_GE(gone, 0);
+  if (gone == 0) ::_exit(0);
+  ASSERT_EQ(::waitpid(gone, nullptr, 0), gone);
+  WriteRaw("Windows Registry Editor Version 5.00\r\n");
+  std::string stale = TemporaryPrefixFor(path) + std::to_string(gone) + "-x1Y2z3";
+  std::ofstream(stale) << "half a settings file";
+  FileRegistryStore store = MakeStore();
+  EXPECT_FALSE(fs::exists(stale));
+  EXPECT_TRUE(fs::exists(path));
 }
 
 TEST(PlatformPaths, SettingsFileAndDataFolderFollowTheEnvironment) {

@@ -77,7 +77,12 @@ class LocalFileSystemImpl : public FileSystem {
   }
 
   void WriteAll(const std::string& path, std::string_view bytes) override {
-    int error = ReplaceFileContents(path, bytes);
+    WriteAll(path, bytes, {});
+  }
+
+  void WriteAll(const std::string& path, std::string_view bytes,
+                const std::function<void()>& progress) override {
+    int error = ReplaceFileContents(path, bytes, nullptr, progress);
     if (error != 0) {
       throw seqerrors::FileAccess("FileSystem.WriteAll", path + ": " + std::strerror(error));
     }

@@ -2,10 +2,12 @@
 // File helpers shared by the adapters that write the player's files: the
 // settings file, the schedule files and the compressed sequence exports.
 // Each of those must survive a crash or a full disk with either its old or
-// its new content, so there is one way of replacing a file, here.
+// its new content, so there is one way of replacing a file, here, and one
+// way of clearing away what a crash in the middle of it left behind.
 
 #include <sys/stat.h>
 
+#include <functional>
 #include <string>
 #include <string_view>
 
@@ -32,12 +34,27 @@ class FileDescriptor {
 // Replaces the file at `path` with exactly `bytes`, so that a reader or a
 // crash finds either the old content or the new, never a part of it: a
 // temporary file beside it is written, flushed to disk and renamed over it,
-// and the folder is flushed so the rename lasts. The file keeps its mode (a
-// new one gets the usual mode under the umask). Returns 0, or the errno of
-// the step that failed, leaving the old file and no temporary behind.
-// `written`, when given, receives the status of the new file.
+// and the folder is flushed so the rename lasts. When `path` is a symbolic
+// link (a settings file kept in a synced folder, say) the file it leads to
+// is replaced and the link stays. The file keeps its mode (a new one gets
+// the usual mode under the umask). Returns 0, or the errno of the step that
+// failed, leaving the old file and no temporary behind. `written`, when
+// given, receives the status of the new file; `progress`, when given, is
+// called after every mebibyte written and after each sync and the rename.
 int ReplaceFileContents(const std::string& path, std::string_view bytes,
-                        struct stat* written = nullptr);
+                        struct stat* written = nullptr, const std::function<void()>& progress = {});
+
+// The temporaries of ReplaceFileContents are named, beside the file they
+// replace, this prefix, the writer's process id, '-' and six characters:
+// "/data/.show.tseq.tcs.tav-tmp-4242-a1B2c3".
+std::string TemporaryPrefixFor(const std::string& path);
+
+// Removes from `folder` the temporaries whose writer is no longer running
+// (left by a crash or a power cut), and nothing else: not a temporary that
+// a live process is still writing, not a file of anybody else's. Returns how
+// many it removed. Called at start for the settings folder and the sequence
+// folder.
+int RemoveStaleTemporaries(const std::string& folder);
 
 // The folder part of a path: "." for a bare name, "/" for the root.
 std::string FolderOf(const std::string& path);

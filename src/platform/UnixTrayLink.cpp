@@ -86,12 +86,15 @@ Probe ProbeSocket(const std::string& path) {
   address.sun_family = AF_UNIX;
   if (path.size() >= sizeof(address.sun_path)) throw Unavailable("Socket path too long: " + path);
   std::memcpy(address.sun_path, path.c_str(), path.size() + 1);
-  int fd = ::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
+  // Never a blocking connect: a player that is alive but stuck, with its
+  // queue of waiting connections full, would keep it waiting for ever. A
+  // full queue (EAGAIN) means somebody listens there all the same.
+  int fd = ::socket(AF_UNIX, SOCK_STREAM | SOCK_NONBLOCK | SOCK_CLOEXEC, 0);
   if (fd < 0) throw Unavailable("Cannot make a socket: " + SystemText(errno));
   int result = ::connect(fd, reinterpret_cast<sockaddr*>(&address), sizeof(address));
   int error = errno;
   ::close(fd);
-  if (result == 0 || error == EAGAIN) return Probe::kLive;
+  if (result == 0 || error == EAGAIN || error == EINPROGRESS) return Probe::kLive;
   if (error == ECONNREFUSED) return Probe::kStale;
   if (error == ENOENT) return Probe::kNothing;
   throw Unavailable("Cannot use " + path + ": " + SystemText(error));

@@ -242,5 +242,47 @@ TEST(UnixTrayLinkPath, ExplicitSocketThenRuntimeDirThenPerUserTmp) {
   if (!savedRuntime.empty()) ::setenv("XDG_RUNTIME_DIR", savedRuntime.c_str(), 1);
 }
 
+// A player that is alive but stuck (stopped, say) listens and accepts
+// nothing; once its queue of waiting connections is full, a blocking connect
+// to it would wait for ever. A new player must see it as running at once.
+TEST(UnixTrayLinkDeathTest, APlayerThatAcceptsNothingCountsAsRunningWithoutWaiting) {
+  std::string pattern = (fs::temp_directory_path() / "tav-tray-XXXXXX").string();
+  ASSERT_NE(::mkdtemp(pattern.data()), nullptr);
+  std::string path = pattern + "/showplayer.sock";
+  int listener = ::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
+  sockaddr_un address{};
+  address.sun_family = AF_UNIX;
+  std::memcpy(address.sun_path, path.c_str(), path.size() + 1);
+  ASSERT_EQ(::bind(listener, reinterpret_cast<sockaddr*>(&address), sizeof address), 0);
+  ASSERT_EQ(::listen(listener, 0), 0);
+  std::vector<int> waiting;
+  for (int i = 0; i < 64; ++i) {
+    int fd = ::socket(AF_UNIX, SOCK_STREAM | SOCK_NONBLOCK | SOCK_CLOEXEC, 0);
+    if (::connect(fd, reinterpret_cast<sockaddr*>(&address), sizeof address) != 0) {
+      ::close(fd);
+      break;
+    }
+    waiting.push_back(fd);
+  }
+  ASSERT_FALSE(waiting.empty());
+
+  EXPECT_EXIT(
+      {
+        ::alarm(5);  // a probe that waits is killed by the alarm
+        try {
+          EventLoop loop;
+          UnixTrayLink link(loop, path);
+          std::_Exit(1);
+        } catch (const Error& e) {
+          std::_Exit(e.Number() == kTrayLinkInUse ? 0 : 2);
+        }
+      },
+      ::testing::ExitedWithCode(0), "");
+
+  for (int fd : waiting) ::close(fd);
+  ::close(listener);
+  fs::remove_all(pattern);
+}
+
 }  // namespace
 }  // namespace tav

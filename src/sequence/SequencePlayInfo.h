@@ -11,6 +11,7 @@
 #include <cstdint>
 #include <functional>
 #include <memory>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -71,10 +72,10 @@ class SequencePlayInfo : public SequenceIdentity {
   void SetErrorText(std::string value) { m_errorText = std::move(value); }
   int32_t TimesPlayed() const { return m_timesPlayed; }
 
-  // Loads when nothing is held and prepares for play. Failures set
-  // ErrorOccurred and ErrorText instead of raising.
+  // Loads when nothing is held and prepares for play. Failures of any kind
+  // set ErrorOccurred and ErrorText instead of raising.
   void InitializeForPlay();
-  // Counts the start and tells the tray.
+  // Counts the start and tells the tray; does nothing when nothing is held.
   void StartPlay();
   void StopPlay();
   // 0 not playing, 3 stopping, anything else playing.
@@ -90,11 +91,13 @@ class SequencePlayInfo : public SequenceIdentity {
   bool GetEvent(PlayEvent& event);
 
   // The media file, resolved, for musical, interactive, startup and shutdown
-  // sequences; "" for the other play types. Loads when nothing is held.
+  // sequences; "" for the other play types and when the load failed. Loads
+  // when nothing is held.
   std::string MediaFilename();
   bool UsesTAV() const;
   bool UsesX10() const;
   bool UsesFennick() const;
+  // Also true for a sequence whose load failed, until Decache.
   bool IsCached() const { return m_compressed != nullptr || m_Sequence != nullptr; }
   bool IsCompressed() const { return m_compressed != nullptr; }
   // Releases what is held; the next operation that needs it loads again.
@@ -105,13 +108,22 @@ class SequencePlayInfo : public SequenceIdentity {
   void ExecuteShellCommand(ShellCommandManager* manager);
 
  private:
+  // Never raises: a failure marks the sequence failed (ErrorOccurred) and
+  // is not tried again until Decache.
   void Load();
-  void LoadCompressedIfCurrent(const std::string& compressedPath, const FileStatus& plain,
-                               const FileStatus& compressed);
+  // Loads the export when it is current. False when it was found stale (a
+  // newer included file, or sources that no longer match its hash), so the
+  // plain load writes it again.
+  bool LoadCompressedIfCurrent(const std::string& plainPath, const std::string& compressedPath,
+                               const FileStatus& plain, const FileStatus& compressed);
+  bool IncludesAFileNewerThan(int64_t modifiedNs) const;
   void LoadPlain(const std::string& plainPath, const std::string& compressedPath,
-                 bool useCompressed);
-  int32_t MemoryNow() const;
-  // The compressed sequence when held, else the full one, else null.
+                 bool useCompressed, bool exportStale);
+  void Fail(const std::string& text);
+  // Nothing when the memory cannot be measured.
+  std::optional<int32_t> MemoryNow() const;
+  // The compressed sequence when held, else the full one when it loaded,
+  // else null.
   Sequence* Held() const;
   void Log(int32_t level, const std::string& text, bool withSequence = false);
 
@@ -129,6 +141,7 @@ class SequencePlayInfo : public SequenceIdentity {
   std::string m_errorText;
   int32_t m_timesPlayed = 0;
   int32_t m_loadMemoryFootprint = 0;
+  bool m_loadFailed = false;
   std::shared_ptr<Sequence> m_Sequence;
   std::shared_ptr<Sequence> m_compressed;
 };

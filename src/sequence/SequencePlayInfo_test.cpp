@@ -5,6 +5,10 @@
 
 #include <cstdlib>
 #include <filesystem>
+#include <functional>
+#include <new>
+#include <optional>
+#include <stdexcept>
 
 #include "platform/LocalFileSystem.h"
 #include "ports/testing/FixedProcessMemory.h"
@@ -44,6 +48,40 @@ class RecordingHost : public SequenceHost {
   std::optional<std::string> playbackFile;
 };
 
+// Wraps a library and makes one step throw something that is no tav::Error,
+// as a damaged file with an absurd size would (std::bad_alloc).
+class ThrowingLibrary : public SequenceLibrary {
+ public:
+  enum class Step { kNothing, kLoad, kLoadCompressed, kWriteCompressed };
+
+  explicit ThrowingLibrary(std::shared_ptr<SequenceLibrary> inner) : m_inner(std::move(inner)) {}
+
+  std::shared_ptr<Sequence> CreateSequence() override {
+    if (throwAt != Step::kLoad) return m_inner->CreateSequence();
+    return std::make_shared<Sequence>(
+        std::make_shared<ManualClock>(),
+        [](const std::string&, const std::function<void()>&)
+            -> std::shared_ptr<const SequenceContent> { throw std::bad_alloc(); });
+  }
+  std::shared_ptr<Sequence> LoadCompressed(const std::string& path) override {
+    if (throwAt == Step::kLoadCompressed) throw std::runtime_error("length out of range");
+    return m_inner->LoadCompressed(path);
+  }
+  void WriteCompressed(const Sequence& sequence, const std::string& path) override {
+    if (throwAt == Step::kWriteCompressed) throw std::bad_alloc();
+    m_inner->WriteCompressed(sequence, path);
+  }
+  std::optional<uint64_t> CurrentSourceHash(const std::string& sequencePath,
+                                            const std::vector<std::string>& included) override {
+    return m_inner->CurrentSourceHash(sequencePath, included);
+  }
+
+  Step throwAt = Step::kNothing;
+
+ private:
+  std::shared_ptr<SequenceLibrary> m_inner;
+};
+
 SequenceData TwoChannels(const std::string& media = "") {
   SequenceData data;
   data.media = media;
@@ -62,7 +100,9 @@ class ExportDecision : public ::testing::Test {
     auto resolver =
         std::make_shared<PathResolver>(files, [dir = m_dir.Path()](int32_t) { return dir; });
     m_library = std::make_shared<FileSequenceLibrary>(m_clock, files, resolver);
-    m_services = {m_library, resolver, files, &m_host, nullptr, [this] { return m_useCompressed; }};
+    m_throwing = std::make_shared<ThrowingLibrary>(m_library);
+    m_services = {m_throwing, resolver, files,
+                  &m_host,    nullptr,  [this] { return m_useCompressed; }};
   }
 
   std::string Path(const std::string& name) const { return m_dir.Path() + name; }
@@ -99,9 +139,20 @@ class ExportDecision : public ::testing::Test {
   RecordingHost m_host;
   std::shared_ptr<ManualClock> m_clock = std::make_shared<ManualClock>();
   std::shared_ptr<FileSequenceLibrary> m_library;
+  std::shared_ptr<ThrowingLibrary> m_throwing;
   SequencePlayServices m_services;
   bool m_useCompressed = true;
 };
+
+// Lines logged about loading, without the ones every load writes.
+std::vector<std::string> Skipping(const std::vector<std::string>& lines,
+                                  const std::string& prefix) {
+  std::vector<std::string> kept;
+  for (const auto& line : lines) {
+    if (line.rfind(prefix, 0) != 0) kept.push_back(line);
+  }
+  return kept;
+}
 
 TEST_F(ExportDecision, PlainFileAloneIsLoadedAndExported) {
   WritePlain("a.json", 1000);
@@ -203,6 +254,108 @@ TEST_F(ExportDecision, UnreadableFileIsAnErrorOfPreparation) {
   EXPECT_EQ(result.rfind("error: ", 0), 0u) << result;
 }
 
+TEST_F(ExportDecision, EditedSubsequenceMakesTheFileLoadAndIsExportedAgain) {
+  WritePlain("sub.json", 1000);
+  SequenceData parent = TwoChannels();
+  parent.subsequences.push_back({"sub.json", 1000});
+  WritePlain("a.json", 1000, parent);
+  Export("a.json", 2000);
+  SequenceData edited = TwoChannels();
+  edited.channels.pop_back();
+  WritePlain("sub.json", 3000, edited);
+  EXPECT_EQ(LoadedFrom("a.json"), "plain");
+  EXPECT_EQ(m_host.lines.back(), "1 Exporting compressed sequence for " + Path("a.json"));
+  // The new export is current: later loads take it.
+  EXPECT_EQ(LoadedFrom("a.json"), "compressed");
+}
+
+TEST_F(ExportDecision, TouchedSubsequenceIsExportedAgainAlthoughUnchanged) {
+  WritePlain("sub.json", 1000);
+  SequenceData parent = TwoChannels();
+  parent.subsequences.push_back({"sub.json", 1000});
+  WritePlain("a.json", 1000, parent);
+  Export("a.json", 2000);
+  SetTime("sub.json", 3000);
+  EXPECT_EQ(LoadedFrom("a.json"), "plain");
+  EXPECT_EQ(LoadedFrom("a.json"), "compressed");
+}
+
+TEST_F(ExportDecision, NestedSubsequencesBesideTheirIncludingFileAreChecked) {
+  // a.json includes parts/one.json, which includes two.json beside it (not
+  // in the sequence folder).
+  WritePlain("parts/two.json", 1000);
+  SequenceData one = TwoChannels();
+  one.subsequences.push_back({"two.json", 500});
+  WritePlain("parts/one.json", 1000, one);
+  SequenceData parent = TwoChannels();
+  parent.subsequences.push_back({"parts/one.json", 1000});
+  WritePlain("a.json", 1000, parent);
+  Export("a.json", 2000);
+  EXPECT_EQ(LoadedFrom("a.json"), "compressed");
+
+  SequenceData edited = TwoChannels();
+  edited.channels.pop_back();
+  WritePlain("parts/two.json", 3000, edited);
+  EXPECT_EQ(LoadedFrom("a.json"), "plain");
+  EXPECT_EQ(LoadedFrom("a.json"), "compressed");
+}
+
+TEST_F(ExportDecision, FilesRestoredWithOlderTimesAreNotCoveredByTheExport) {
+  // A backup restored (rsync -a, unzip) keeps its old modification time,
+  // older than the export made from the newer content.
+  SequenceData older = TwoChannels();
+  older.channels.pop_back();
+  struct Case {
+    const char* restored;
+  } cases[] = {{"a.json"}, {"sub.json"}};
+  for (const auto& c : cases) {
+    WritePlain("sub.json", 1000);
+    SequenceData parent = TwoChannels();
+    parent.subsequences.push_back({"sub.json", 1000});
+    WritePlain("a.json", 1000, parent);
+    Export("a.json", 2000);
+    if (std::string(c.restored) == "a.json") {
+      older.subsequences = parent.subsequences;
+      WritePlain("a.json", 500, older);
+      older.subsequences.clear();
+    } else {
+      WritePlain("sub.json", 500, older);
+    }
+    m_host.lines.clear();
+    EXPECT_EQ(LoadedFrom("a.json"), "plain") << c.restored;
+    EXPECT_THAT(m_host.lines,
+                ElementsAre("1 Loading compressed sequence: " + Path("a.json.tcs"),
+                            "1 Compressed sequence does not match its sequence file - loading "
+                            "sequence instead",
+                            "1 Loading sequence: " + Path("a.json"),
+                            "1 Exporting compressed sequence for " + Path("a.json")))
+        << c.restored;
+    EXPECT_EQ(LoadedFrom("a.json"), "compressed") << c.restored;
+  }
+}
+
+TEST_F(ExportDecision, FailuresOfAnyKindFallBackOrMarkTheSequenceFailed) {
+  WritePlain("a.json", 1000);
+  Export("a.json", 2000);
+  m_throwing->throwAt = ThrowingLibrary::Step::kLoadCompressed;
+  EXPECT_EQ(LoadedFrom("a.json"), "plain");
+  EXPECT_THAT(m_host.lines,
+              ::testing::Contains("2 Cannot load compressed sequence file for " + Path("a.json")));
+
+  SetTime("a.json.tcs", 500);  // the file is newer: it is loaded and exported
+  m_throwing->throwAt = ThrowingLibrary::Step::kWriteCompressed;
+  m_host.lines.clear();
+  WritePlain("a.json", 1000, SequenceData{});
+  EXPECT_EQ(LoadedFrom("a.json"), "plain");
+  EXPECT_EQ(m_host.lines.back(), "2 Cannot export compressed sequence for " + Path("a.json"));
+
+  m_throwing->throwAt = ThrowingLibrary::Step::kLoad;
+  m_host.lines.clear();
+  EXPECT_EQ(LoadedFrom("a.json"), "error: std::bad_alloc");
+  EXPECT_THAT(Skipping(m_host.lines, "1 Loading compressed"),
+              ElementsAre("1 Loading sequence: " + Path("a.json")));
+}
+
 // ---- Everything else, on sequences held in memory ---------------------------
 
 class PlayInfo : public ::testing::Test {
@@ -266,18 +419,37 @@ TEST_F(PlayInfo, EmptyFilenameIsAnErrorWithoutRaising) {
   EXPECT_EQ(info.ErrorText(), "No filename specified");
 }
 
-TEST_F(PlayInfo, NoPlaybackFileMeansNothingLoadedAndHarmlessPlay) {
+TEST_F(PlayInfo, NoPlaybackFileIsAFailureAskedOnceAndHarmlessToPlay) {
   m_host.playbackFile = "";
   SequencePlayInfo info(m_services);
   info.SetFilename("missing.json");
+  info.SetPlayType(5);
   info.InitializeForPlay();
-  EXPECT_FALSE(info.ErrorOccurred());
+  EXPECT_TRUE(info.ErrorOccurred());
+  EXPECT_EQ(info.ErrorText(), "No playable file for missing.json");
   EXPECT_FALSE(info.IsCached());
   EXPECT_EQ(info.Filename(), "");
+  EXPECT_EQ(info.MediaFilename(), "");
+  info.InitializeForPlay();
+  EXPECT_EQ(info.ErrorText(), "No playable file for missing.json");
+  EXPECT_THAT(m_host.lines, ElementsAre("1 Checking Q7 sequence: missing.json"));
+  EXPECT_THAT(m_host.asked, ElementsAre("missing.json"));
+
+  info.StartPlay();
+  info.StopPlay();
+  EXPECT_EQ(info.TimesPlayed(), 0);
+  EXPECT_THAT(m_host.starts, IsEmpty());
   EXPECT_EQ(info.SequencePlayState(), 0);
   PlayEvent event;
   EXPECT_FALSE(info.GetEvent(event));
   EXPECT_FALSE(info.UsesTAV());
+}
+
+TEST_F(PlayInfo, StartingASequenceThatHoldsNothingDoesNothing) {
+  auto info = Make("a.json", 5);
+  info->StartPlay();
+  EXPECT_EQ(info->TimesPlayed(), 0);
+  EXPECT_THAT(m_host.starts, IsEmpty());
 }
 
 TEST_F(PlayInfo, StartCountsEveryStartAndTellsTheTray) {
@@ -367,6 +539,20 @@ TEST_F(PlayInfo, FootprintIsTheGrowthAcrossThePlainLoad) {
   EXPECT_EQ(info->LoadMemoryFootprint(), 0);
 }
 
+TEST_F(PlayInfo, AFailedMeasurementMakesTheFootprintUnknown) {
+  auto info = Make("a.json", 4);
+  m_memory->Set(50000);
+  m_memory->QueueFailure();  // before the load
+  info->InitializeForPlay();
+  EXPECT_EQ(info->LoadMemoryFootprint(), 0);
+
+  info->Decache();
+  m_memory->QueueValues({1000});
+  m_memory->QueueFailure();  // after the load
+  info->InitializeForPlay();
+  EXPECT_EQ(info->LoadMemoryFootprint(), 0);
+}
+
 TEST_F(PlayInfo, KeepAliveReachesTheChannelIOWhileLoading) {
   auto cio = std::make_shared<RecordingChannelIO>();
   auto info = Make("a.json", 4);
@@ -375,13 +561,51 @@ TEST_F(PlayInfo, KeepAliveReachesTheChannelIOWhileLoading) {
   EXPECT_GE(cio->CountOf("KeepAlive"), 1u);
 }
 
-TEST_F(PlayInfo, LoadFailureSetsTheErrorText) {
-  auto info = Make("bad.json", 4);
+TEST_F(PlayInfo, AFailedLoadIsHeldAndNotTriedAgain) {
+  auto info = Make("bad.json", 5);
   m_library->FailLoading(m_resolver->ResolvePath("bad.json", PathResolver::kKindSequence));
-  info->InitializeForPlay();
+  for (int i = 0; i < 3; ++i) {
+    EXPECT_EQ(info->MediaFilename(), "");
+    info->InitializeForPlay();
+  }
   EXPECT_TRUE(info->ErrorOccurred());
-  EXPECT_FALSE(info->ErrorText().empty());
+  EXPECT_NE(info->ErrorText().find("made to fail"), std::string::npos) << info->ErrorText();
+  EXPECT_TRUE(info->IsCached());
+  EXPECT_EQ(m_library->Loads().size(), 1u);
+  EXPECT_EQ(Skipping(m_host.lines, "1 Checking Q7"),
+            std::vector<std::string>{"1 Loading sequence: bad.json"});
+  info->StartPlay();
+  EXPECT_EQ(info->TimesPlayed(), 0);
+  EXPECT_EQ(info->SequencePlayState(), 0);
+
+  // Released by a decache, it is tried again on next use.
+  info->Decache();
   EXPECT_FALSE(info->IsCached());
+  info->InitializeForPlay();
+  EXPECT_EQ(m_library->Loads().size(), 2u);
+}
+
+TEST_F(PlayInfo, AStillStoppingSequenceIsForcedToStopWhenPreparedAgain) {
+  auto info = Make("a.json", 4);
+  info->SetLightsOffAtEnd(true);
+  info->InitializeForPlay();
+  info->StartPlay();
+  info->StopPlay();
+  ASSERT_EQ(info->SequencePlayState(), 3);
+  m_host.lines.clear();
+  info->InitializeForPlay();
+  EXPECT_THAT(m_host.lines, ElementsAre("0 Forcing stop of still-stopping sequence [seq]"));
+  EXPECT_NE(info->SequencePlayState(), 3);
+}
+
+TEST_F(PlayInfo, AKeepAliveThatFailsDoesNotFailTheLoad) {
+  auto cio = std::make_shared<RecordingChannelIO>();
+  cio->FailNext("KeepAlive", 91, "no client");
+  auto info = Make("a.json", 4);
+  info->SetCIO(cio);
+  info->InitializeForPlay();
+  EXPECT_FALSE(info->ErrorOccurred());
+  EXPECT_TRUE(info->IsCached());
 }
 
 TEST_F(PlayInfo, ShellCommandIsPreparedCompletedAndRun) {

@@ -7,9 +7,16 @@
 namespace tav {
 namespace {
 
-// The lenient number read of playlist fields: never a type mismatch.
+// The lenient number read of playlist fields, which never fails: a field
+// without a number gives 0, and so does one whose number does not fit in 32
+// bits ("99999999999", "1e10"), since such a number is no order, type or
+// delay anybody meant and must not cost the whole show.
 int32_t NumberField(const std::string& field) {
-  return NumberOf(UnescapeText(field));
+  try {
+    return NumberOf(UnescapeText(field));
+  } catch (const Error&) {
+    return 0;  // the overflow error, the only one NumberOf raises
+  }
 }
 
 }  // namespace

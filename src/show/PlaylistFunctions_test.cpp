@@ -48,6 +48,10 @@ TEST(PlaylistText, ReadingOlderAndOddTexts) {
       {"(0,7s,2, 2.5,,,T,F,F)", "(0,7,2,2,,,T,F,F)"},
       {"(0,abc,2,3.5,,,T,F,F)", "(0,0,2,4,,,T,F,F)"},
       {"(0,1e2,2,*E5,,,T,F,F)", "(0,100,2,0,,,T,F,F)"},
+      // Numbers beyond 32 bits are unreadable, so 0, never a failed show.
+      {"(0,99999999999,2,1e10,,,T,F,F)", "(0,0,2,0,,,T,F,F)"},
+      {"(0,-1e10,2,1e999,,,T,F,F)", "(0,0,2,0,,,T,F,F)"},
+      {"(2147483647,0,1,0,,,T,F,F)", "(2147483647,0,1,0,,,T,F,F)"},
       // An empty names field gives no entries, "()" one empty entry.
       {"(1,0,1,0,,(),T,F,F)", "(1,0,1,0,,(),T,F,F)"},
       // Absent trailing flags: LightsOffAtEnd stays true, shuffles read true.

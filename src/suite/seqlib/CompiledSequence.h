@@ -38,7 +38,10 @@ struct CompiledSequence {
   int64_t lengthMs = 0;
   std::string media;
   std::string shellCommand;
-  // As the source names them, kept so a stale export can be recognised.
+  // The files merged in: for a compiled plain sequence and its export every
+  // included file as the library found it (nested ones too, at their offset
+  // in this sequence), kept so a stale export can be recognised; as the
+  // authored data names them when compiled from data alone.
   std::vector<SubsequenceRef> subsequences;
   uint64_t sourceHash = 0;
   std::vector<CompiledChannel> channels;

@@ -2,6 +2,7 @@
 
 #include <zstd.h>
 
+#include <algorithm>
 #include <cstring>
 #include <memory>
 
@@ -111,7 +112,47 @@ bool LooksLikeCompressedSequence(std::string_view bytes) {
   return bytes.size() >= 4 && std::memcmp(bytes.data(), kMagic, 4) == 0;
 }
 
-std::string WriteCompressedSequence(const CompiledSequence& s, int level) {
+namespace {
+
+// One zstd frame holding `payload`, its size stated in the frame header,
+// compressed a piece at a time so that `progress` can be called between
+// pieces.
+std::string CompressPayload(const std::string& payload, int level,
+                            const std::function<void()>& progress) {
+  constexpr size_t kPiece = 1 << 20;
+  std::unique_ptr<ZSTD_CCtx, size_t (*)(ZSTD_CCtx*)> context(ZSTD_createCCtx(), ZSTD_freeCCtx);
+  if (!context) throw seqerrors::FileAccess("CompressedSequence.Write", "out of memory");
+  auto check = [](size_t result) {
+    if (ZSTD_isError(result))
+      throw seqerrors::FileAccess("CompressedSequence.Write", ZSTD_getErrorName(result));
+    return result;
+  };
+  check(ZSTD_CCtx_setParameter(context.get(), ZSTD_c_compressionLevel, level));
+  check(ZSTD_CCtx_setPledgedSrcSize(context.get(), payload.size()));
+  std::string compressed(ZSTD_compressBound(payload.size()), '\0');
+  ZSTD_outBuffer out{compressed.data(), compressed.size(), 0};
+  size_t done = 0;
+  while (true) {
+    size_t piece = std::min(kPiece, payload.size() - done);
+    bool last = done + piece == payload.size();
+    ZSTD_inBuffer in{payload.data() + done, piece, 0};
+    size_t left;
+    do {
+      left = check(
+          ZSTD_compressStream2(context.get(), &out, &in, last ? ZSTD_e_end : ZSTD_e_continue));
+    } while (last ? left != 0 : in.pos < in.size);
+    done += piece;
+    if (progress) progress();
+    if (last) break;
+  }
+  compressed.resize(out.pos);
+  return compressed;
+}
+
+}  // namespace
+
+std::string WriteCompressedSequence(const CompiledSequence& s, int level,
+                                    const std::function<void()>& progress) {
   Out p;
   p.I64(s.lengthMs);
   p.Text(s.media);
@@ -152,12 +193,7 @@ std::string WriteCompressedSequence(const CompiledSequence& s, int level) {
     p.Bytes(t.levels.data(), t.FrameCount() * static_cast<size_t>(t.count));
   }
   const std::string& payload = p.Str();
-  std::string compressed(ZSTD_compressBound(payload.size()), '\0');
-  size_t size =
-      ZSTD_compress(compressed.data(), compressed.size(), payload.data(), payload.size(), level);
-  if (ZSTD_isError(size))
-    throw seqerrors::FileAccess("CompressedSequence.Write", ZSTD_getErrorName(size));
-  compressed.resize(size);
+  std::string compressed = CompressPayload(payload, level, progress);
 
   Out h;
   h.Bytes(kMagic, 4);

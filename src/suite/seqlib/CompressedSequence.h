@@ -6,6 +6,7 @@
 // length against the bytes present and reports damage as a tav::Error.
 
 #include <cstdint>
+#include <functional>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -19,7 +20,10 @@ constexpr size_t kCompressedHeaderBytes = 40;
 
 bool LooksLikeCompressedSequence(std::string_view bytes);
 
-std::string WriteCompressedSequence(const CompiledSequence& sequence, int level = 3);
+// `progress`, when given, is called now and then while the payload is
+// compressed (a large export takes a while).
+std::string WriteCompressedSequence(const CompiledSequence& sequence, int level = 3,
+                                    const std::function<void()>& progress = {});
 // `name` is used in error messages only.
 CompiledSequence ReadCompressedSequence(std::string_view bytes, const std::string& name);
 // The source hash from the header; nothing when the bytes are no export.

@@ -64,6 +64,20 @@ TEST(CompressedSequence, EveryTruncationAndEveryFlippedByteIsAnErrorOrHarmless) 
   }
 }
 
+TEST(CompressedSequence, ALargeExportReportsProgressWhileCompressing) {
+  SequenceData data;
+  for (int c = 0; c < 100; ++c) {
+    SequenceChannel channel{"c" + std::to_string(c), {kFamilyDMX, 1, 0, c + 1}, {}};
+    for (int i = 0; i < 1000; ++i) channel.effects.push_back({i * 10, 10, kEffectFade, 0, 100, 0});
+    data.channels.push_back(channel);
+  }
+  CompiledSequence compiled = Compile(data, [](const SubsequenceRef&) { return nullptr; });
+  int calls = 0;
+  std::string bytes = WriteCompressedSequence(compiled, 3, [&] { ++calls; });
+  EXPECT_GE(calls, 2);  // 100,000 effects of 23 bytes: more than one mebibyte
+  EXPECT_EQ(ReadCompressedSequence(bytes, "large.tcs"), compiled);
+}
+
 TEST(CompressedSequence, RefusesOtherFilesAndNewerVersions) {
   EXPECT_FALSE(ReadCompressedSourceHash("PSEQ............").has_value());
   try {

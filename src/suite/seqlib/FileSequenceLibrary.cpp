@@ -1,6 +1,8 @@
 #include "suite/seqlib/FileSequenceLibrary.h"
 
 #include <algorithm>
+#include <map>
+#include <set>
 
 #include "suite/seqlib/CompiledEventStream.h"
 #include "suite/seqlib/CompressedSequence.h"
@@ -15,8 +17,14 @@ namespace tav {
 namespace {
 
 constexpr const char* kSource = "SequenceLibrary.Load";
+constexpr size_t kHashPiece = 1 << 20;
 
 enum class Format { Plain, Fseq, Compressed };
+
+// What a file is read for: to play it (an FSEQ file then plays from disk),
+// to compile it (an FSEQ file is read whole into level tracks: for a
+// subsequence or an export), or to load it as an export and nothing else.
+enum class Purpose { kPlay, kCompile, kExportOnly };
 
 std::string Directory(const std::string& path) {
   auto slash = path.find_last_of('/');
@@ -29,6 +37,38 @@ std::vector<int32_t> FamiliesOf(const CompiledSequence& compiled) {
     if (compiled.UsesFamily(family)) families.push_back(family);
   }
   return families;
+}
+
+// What one load gathers while it includes subsequences.
+struct LoadContext {
+  std::function<void()> keepAlive;
+  // The files being included, the outermost first, to catch circles.
+  std::vector<std::string> chain;
+  // The content hash of every file read, by path.
+  std::map<std::string, uint64_t> fileHashes;
+
+  void KeepAlive() const {
+    if (keepAlive) keepAlive();
+  }
+};
+
+// The combined hash of a file and the files it included, each counted once.
+uint64_t CombinedHash(uint64_t own, const std::vector<SubsequenceRef>& included,
+                      const std::function<std::optional<uint64_t>(const std::string&)>& hashOf,
+                      bool& complete) {
+  std::vector<uint64_t> hashes;
+  std::set<std::string> seen;
+  complete = true;
+  for (const auto& ref : included) {
+    if (!seen.insert(ref.file).second) continue;
+    std::optional<uint64_t> hash = hashOf(ref.file);
+    if (!hash) {
+      complete = false;
+      return 0;
+    }
+    hashes.push_back(*hash);
+  }
+  return CombinedContentHash(own, hashes);
 }
 
 }  // namespace
@@ -62,6 +102,67 @@ struct FileSequenceLibrary::Core {
     return fileSystem->OpenForRead(path);
   }
 
+  // The one place that tells formats apart and decides what each becomes.
+  std::shared_ptr<const SequenceContent> Read(const std::string& path, Purpose purpose,
+                                              LoadContext& context) const {
+    auto file = Open(path);
+    Format format = Detect(*file);
+    if (purpose == Purpose::kExportOnly && format != Format::Compressed) {
+      throw seqerrors::InvalidFormat("SequenceLibrary.LoadCompressed",
+                                     path + " is not a compressed sequence");
+    }
+    switch (format) {
+      case Format::Compressed: {
+        std::string bytes = fileSystem->ReadAll(path);
+        context.fileHashes[path] = ContentHash(bytes);
+        auto compiled = std::make_shared<CompiledSequence>(ReadCompressedSequence(bytes, path));
+        return FromCompiled(compiled, "tcs", path, compiled->subsequences, [] { return true; });
+      }
+      case Format::Fseq:
+        if (purpose == Purpose::kPlay) return PlayFseq(std::move(file), path);
+        return FromCompiled(CompileFseq(std::move(file), path, context), "fseq", path, {},
+                            [] { return true; });
+      case Format::Plain:
+      default:
+        return ReadPlain(path, context);
+    }
+  }
+
+  std::shared_ptr<const SequenceContent> PlayFseq(std::shared_ptr<const RandomAccessFile> file,
+                                                  const std::string& path) const {
+    FseqFile fseq(file);
+    auto content = std::make_shared<SequenceContent>();
+    SequenceInfo& info = content->info;
+    info.format = "fseq";
+    info.path = path;
+    info.lengthMs = static_cast<int64_t>(fseq.DurationMs());
+    info.media = fseq.MediaFilename();
+    info.families = {kFamilyDMX};
+    uint64_t channels = 0;
+    for (const auto& range : fseq.Ranges()) channels += range.count;
+    info.channelCount = channels;
+    info.frameCount = fseq.FrameCount();
+    UniverseMap map = universes;
+    content->openStream = [file, map] {
+      return std::make_unique<FseqEventStream>(std::make_unique<FseqFile>(file), map);
+    };
+    // Nothing to gain from an export: FSEQ is already a compiled form.
+    content->hasBeenExported = [] { return true; };
+    return content;
+  }
+
+  std::shared_ptr<const CompiledSequence> CompileFseq(std::shared_ptr<const RandomAccessFile> file,
+                                                      const std::string& path,
+                                                      LoadContext& context) const {
+    FseqFile fseq(std::move(file));
+    auto compiled = std::make_shared<CompiledSequence>(
+        Compile(FseqToSequenceData(fseq, universes, context.keepAlive),
+                [](const SubsequenceRef&) { return nullptr; }));
+    compiled->sourceHash = HashOfFile(path).value_or(0);
+    context.fileHashes[path] = compiled->sourceHash;
+    return compiled;
+  }
+
   std::string ResolveSubsequence(const std::string& name, const std::string& includingPath) const {
     if (PathResolver::IsAbsolute(name) && fileSystem->Stat(name).IsFile()) return name;
     if (!PathResolver::IsAbsolute(name) && !PathResolver::IsForeignAbsolute(name)) {
@@ -77,61 +178,78 @@ struct FileSequenceLibrary::Core {
     throw seqerrors::FileNotFound(kSource, name + " (subsequence of " + includingPath + ")");
   }
 
-  std::shared_ptr<const CompiledSequence> CompilePlain(const std::string& path,
-                                                       const std::string& text,
-                                                       const std::function<void()>& keepAlive,
-                                                       std::vector<std::string>& including) const {
-    uint64_t hash = ContentHash(text);
-    if (keepAlive) keepAlive();
-    SequenceData data = ParsePlainSequence(text, path, keepAlive);
-    if (keepAlive) keepAlive();
-    including.push_back(path);
+  // A plain sequence compiled with its subsequences merged in. Its compiled
+  // form lists every file it included (nested ones too, where they were
+  // found, at their offsets in this sequence) and records the combined hash
+  // of all of them with its own; its info names the subsequences as the file
+  // writes them.
+  std::shared_ptr<const SequenceContent> ReadPlain(const std::string& path,
+                                                   LoadContext& context) const {
+    std::string text = fileSystem->ReadAll(path);
+    uint64_t own = ContentHash(text);
+    context.fileHashes[path] = own;
+    context.KeepAlive();
+    SequenceData data = ParsePlainSequence(text, path, context.keepAlive);
+    context.KeepAlive();
+    context.chain.push_back(path);
+    std::vector<SubsequenceRef> included;
     auto loadSub = [&](const SubsequenceRef& ref) {
       std::string subPath = ResolveSubsequence(ref.file, path);
-      if (std::find(including.begin(), including.end(), subPath) != including.end()) {
+      if (std::find(context.chain.begin(), context.chain.end(), subPath) != context.chain.end()) {
         std::string chain;
-        for (const auto& p : including) chain += p + " includes ";
+        for (const auto& p : context.chain) chain += p + " includes ";
         throw seqerrors::InvalidFormat(kSource,
                                        "subsequences include each other: " + chain + subPath);
       }
-      if (static_cast<int>(including.size()) >= kMaxSubsequenceDepth) {
+      if (static_cast<int>(context.chain.size()) >= kMaxSubsequenceDepth) {
         throw seqerrors::InvalidFormat(kSource, path + ": subsequences nest deeper than " +
                                                     std::to_string(kMaxSubsequenceDepth) +
                                                     " levels");
       }
-      return LoadCompiled(subPath, keepAlive, including);
+      auto sub = Read(subPath, Purpose::kCompile, context);
+      included.push_back({subPath, ref.offsetMs});
+      // An export included as a subsequence counts as one file: its bytes.
+      if (sub->info.format == "plain") {
+        for (const auto& nested : sub->compiled->subsequences) {
+          included.push_back({nested.file, nested.offsetMs + ref.offsetMs});
+        }
+      }
+      return sub->compiled;
     };
     auto compiled = std::make_shared<CompiledSequence>(Compile(data, loadSub));
-    including.pop_back();
-    compiled->sourceHash = hash;
-    return compiled;
-  }
+    context.chain.pop_back();
+    compiled->subsequences = included;
+    bool complete = false;
+    compiled->sourceHash = CombinedHash(
+        own, included,
+        [&context](const std::string& file) -> std::optional<uint64_t> {
+          auto it = context.fileHashes.find(file);
+          if (it == context.fileHashes.end()) return std::nullopt;
+          return it->second;
+        },
+        complete);
 
-  std::shared_ptr<const CompiledSequence> LoadCompiled(const std::string& path,
-                                                       const std::function<void()>& keepAlive,
-                                                       std::vector<std::string>& including) const {
-    auto file = Open(path);
-    switch (Detect(*file)) {
-      case Format::Compressed:
-        return std::make_shared<CompiledSequence>(
-            ReadCompressedSequence(fileSystem->ReadAll(path), path));
-      case Format::Fseq: {
-        FseqFile fseq(file);
-        auto compiled = std::make_shared<CompiledSequence>(
-            Compile(FseqToSequenceData(fseq, universes, keepAlive),
-                    [](const SubsequenceRef&) { return nullptr; }));
-        compiled->sourceHash = ContentHash(fileSystem->ReadAll(path));
-        return compiled;
+    auto fs = fileSystem;
+    uint64_t hash = compiled->sourceHash;
+    std::string exportPath = path + "." + kCompressedExtension;
+    return FromCompiled(compiled, "plain", path, data.subsequences, [fs, hash, exportPath] {
+      if (!fs->Stat(exportPath).IsFile()) return false;
+      try {
+        auto file = fs->OpenForRead(exportPath);
+        char header[kCompressedHeaderBytes] = {};
+        size_t n = file->ReadAt(0, header, sizeof header);
+        auto recorded = ReadCompressedSourceHash(std::string_view(header, n));
+        return recorded && *recorded == hash;
+      } catch (const Error&) {
+        return false;
       }
-      case Format::Plain:
-      default:
-        return CompilePlain(path, fileSystem->ReadAll(path), keepAlive, including);
-    }
+    });
   }
 
   std::shared_ptr<const SequenceContent> FromCompiled(
       std::shared_ptr<const CompiledSequence> compiled, const std::string& format,
-      const std::string& path, std::function<bool()> exported) const {
+      const std::string& path, std::vector<SubsequenceRef> subsequences,
+      std::function<bool()> exported) const {
     auto content = std::make_shared<SequenceContent>();
     SequenceInfo& info = content->info;
     info.format = format;
@@ -139,7 +257,7 @@ struct FileSequenceLibrary::Core {
     info.lengthMs = compiled->lengthMs;
     info.media = compiled->media;
     info.shellCommand = compiled->shellCommand;
-    info.subsequences = compiled->subsequences;
+    info.subsequences = std::move(subsequences);
     info.families = FamiliesOf(*compiled);
     info.channelCount = compiled->channels.size();
     info.effectCount = compiled->effects.size();
@@ -151,56 +269,23 @@ struct FileSequenceLibrary::Core {
     return content;
   }
 
-  std::shared_ptr<const SequenceContent> Load(const std::string& path,
-                                              const std::function<void()>& keepAlive) const {
-    auto file = Open(path);
-    switch (Detect(*file)) {
-      case Format::Fseq: {
-        std::shared_ptr<const RandomAccessFile> shared = file;
-        FseqFile fseq(shared);
-        auto content = std::make_shared<SequenceContent>();
-        SequenceInfo& info = content->info;
-        info.format = "fseq";
-        info.path = path;
-        info.lengthMs = static_cast<int64_t>(fseq.DurationMs());
-        info.media = fseq.MediaFilename();
-        info.families = {kFamilyDMX};
-        uint64_t channels = 0;
-        for (const auto& range : fseq.Ranges()) channels += range.count;
-        info.channelCount = channels;
-        info.frameCount = fseq.FrameCount();
-        UniverseMap map = universes;
-        content->openStream = [shared, map] {
-          return std::make_unique<FseqEventStream>(std::make_unique<FseqFile>(shared), map);
-        };
-        // Nothing to gain from an export: FSEQ is already a compiled form.
-        content->hasBeenExported = [] { return true; };
-        return content;
+  // The content hash of a file's bytes, read a piece at a time; nothing
+  // when it cannot be read.
+  std::optional<uint64_t> HashOfFile(const std::string& path) const {
+    try {
+      if (!fileSystem->Stat(path).IsFile()) return std::nullopt;
+      auto file = fileSystem->OpenForRead(path);
+      ContentHasher hasher;
+      std::string piece(static_cast<size_t>(std::min<uint64_t>(file->Size(), kHashPiece)), '\0');
+      for (uint64_t at = 0; at < file->Size();) {
+        size_t n = file->ReadAt(at, piece.data(), piece.size());
+        if (n == 0) return std::nullopt;  // shrank while being read
+        hasher.Update(std::string_view(piece.data(), n));
+        at += n;
       }
-      case Format::Compressed:
-        return FromCompiled(std::make_shared<CompiledSequence>(
-                                ReadCompressedSequence(fileSystem->ReadAll(path), path)),
-                            "tcs", path, [] { return true; });
-      case Format::Plain:
-      default: {
-        std::vector<std::string> including;
-        auto compiled = CompilePlain(path, fileSystem->ReadAll(path), keepAlive, including);
-        auto fs = fileSystem;
-        uint64_t hash = compiled->sourceHash;
-        std::string exportPath = path + "." + kCompressedExtension;
-        return FromCompiled(compiled, "plain", path, [fs, hash, exportPath] {
-          if (!fs->Stat(exportPath).IsFile()) return false;
-          try {
-            auto file = fs->OpenForRead(exportPath);
-            char header[kCompressedHeaderBytes] = {};
-            size_t n = file->ReadAt(0, header, sizeof header);
-            auto recorded = ReadCompressedSourceHash(std::string_view(header, n));
-            return recorded && *recorded == hash;
-          } catch (const Error&) {
-            return false;
-          }
-        });
-      }
+      return hasher.Value();
+    } catch (const Error&) {
+      return std::nullopt;
     }
   }
 };
@@ -224,39 +309,53 @@ std::shared_ptr<Sequence> FileSequenceLibrary::CreateSequence() {
   std::shared_ptr<const Core> core = m_core;
   return std::make_shared<Sequence>(
       m_clock, [core](const std::string& path, const std::function<void()>& keepAlive) {
-        return core->Load(path, keepAlive);
+        LoadContext context{keepAlive, {}, {}};
+        return core->Read(path, Purpose::kPlay, context);
       });
 }
 
 std::shared_ptr<Sequence> FileSequenceLibrary::LoadCompressed(const std::string& path) {
   auto sequence = CreateSequence();
-  auto file = m_core->Open(path);
-  if (m_core->Detect(*file) != Format::Compressed) {
-    throw seqerrors::InvalidFormat("SequenceLibrary.LoadCompressed",
-                                   path + " is not a compressed sequence");
-  }
-  sequence->Attach(m_core->FromCompiled(std::make_shared<CompiledSequence>(ReadCompressedSequence(
-                                            m_core->fileSystem->ReadAll(path), path)),
-                                        "tcs", path, [] { return true; }));
+  LoadContext context;
+  sequence->Attach(m_core->Read(path, Purpose::kExportOnly, context));
   return sequence;
 }
 
 void FileSequenceLibrary::WriteCompressed(const Sequence& sequence, const std::string& path) {
   auto content = sequence.Content();
   if (!content) throw errors::ObjectNotSet("SequenceLibrary.WriteCompressed");
-  auto compiled = content->compiled ? content->compiled : LoadCompiled(content->info.path);
-  m_core->fileSystem->WriteAll(path, WriteCompressedSequence(*compiled));
+  std::function<void()> keepAlive = sequence.KeepAliveRaiser();
+  auto compiled =
+      content->compiled ? content->compiled : LoadCompiled(content->info.path, keepAlive);
+  std::string bytes = WriteCompressedSequence(*compiled, 3, keepAlive);
+  keepAlive();
+  m_core->fileSystem->WriteAll(path, bytes, keepAlive);
+}
+
+std::optional<uint64_t> FileSequenceLibrary::CurrentSourceHash(
+    const std::string& sequencePath, const std::vector<std::string>& includedFiles) {
+  std::optional<uint64_t> own = m_core->HashOfFile(sequencePath);
+  if (!own) return std::nullopt;
+  std::vector<SubsequenceRef> included;
+  for (const auto& file : includedFiles) included.push_back({file, 0});
+  bool complete = false;
+  uint64_t hash = CombinedHash(
+      *own, included, [this](const std::string& file) { return m_core->HashOfFile(file); },
+      complete);
+  if (!complete) return std::nullopt;
+  return hash;
 }
 
 std::shared_ptr<const SequenceContent> FileSequenceLibrary::LoadContent(
     const std::string& path, const std::function<void()>& keepAlive) const {
-  return m_core->Load(path, keepAlive);
+  LoadContext context{keepAlive, {}, {}};
+  return m_core->Read(path, Purpose::kPlay, context);
 }
 
 std::shared_ptr<const CompiledSequence> FileSequenceLibrary::LoadCompiled(
     const std::string& path, const std::function<void()>& keepAlive) const {
-  std::vector<std::string> including;
-  return m_core->LoadCompiled(path, keepAlive, including);
+  LoadContext context{keepAlive, {}, {}};
+  return m_core->Read(path, Purpose::kCompile, context)->compiled;
 }
 
 }  // namespace tav

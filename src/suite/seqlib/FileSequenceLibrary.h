@@ -6,12 +6,20 @@
 // disk block by block; absolute FSEQ channels land on DMX universes through
 // the universe map.
 //
+// An export lists every file its sequence included, nested ones too, as the
+// library found them, and records the combined content hash of the sequence
+// file and all of those (ContentHash.h): editing any of them, or putting
+// back an older copy with an older time, makes the export stale.
+//
 // Shares the clock, the file system and the resolver with whoever made it;
 // the sequences it makes keep what they need alive on their own.
 
+#include <cstdint>
 #include <functional>
 #include <memory>
+#include <optional>
 #include <string>
+#include <vector>
 
 #include "suite/seqlib/FileSystem.h"
 #include "suite/seqlib/PathResolver.h"
@@ -36,6 +44,8 @@ class FileSequenceLibrary : public SequenceLibrary {
   std::shared_ptr<Sequence> CreateSequence() override;
   std::shared_ptr<Sequence> LoadCompressed(const std::string& path) override;
   void WriteCompressed(const Sequence& sequence, const std::string& path) override;
+  std::optional<uint64_t> CurrentSourceHash(const std::string& sequencePath,
+                                            const std::vector<std::string>& includedFiles) override;
 
   // What a load produces, without a sequence object around it.
   std::shared_ptr<const SequenceContent> LoadContent(

@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <cstdlib>
+#include <filesystem>
 
 #include "platform/LocalFileSystem.h"
 #include "ports/testing/ManualClock.h"
@@ -147,11 +148,17 @@ TEST_F(Library, ExportRoundTripAndTheExportedFlag) {
 
   auto compressed = library.LoadCompressed(path + ".tcs");
   EXPECT_EQ(compressed->Info().format, "tcs");
-  EXPECT_EQ(compressed->SubsequenceNames(), sequence->SubsequenceNames());
+  // The export lists the files it was made from, where they were found.
+  EXPECT_EQ(compressed->SubsequenceNames(), std::vector<std::string>{dir.Path() + "intro.tseq"});
   EXPECT_EQ(compressed->MediaFilename(), "tune.ogg");
   EXPECT_EQ(*compressed->Content()->compiled, *sequence->Content()->compiled);
 
-  // An edited source, loaded afresh, is no longer exported.
+  // An edited source or subsequence, loaded afresh, is no longer exported.
+  dir.Write("intro.tseq", std::string(kIntro) + " ");
+  auto afterSubEdit = library.CreateSequence();
+  afterSubEdit->LoadFile(path);
+  EXPECT_FALSE(afterSubEdit->HasBeenExported());
+  dir.Write("intro.tseq", kIntro);
   dir.Write("main.tseq", std::string(kMain) + " ");
   auto again = library.CreateSequence();
   again->LoadFile(path);
@@ -253,6 +260,60 @@ TEST_F(Library, KeepAliveIsRaisedWhileALargeFileLoads) {
   sequence->LoadFile(path);
   EXPECT_GE(raised, 3);
   EXPECT_EQ(sequence->Info().effectCount, 20000u);
+}
+
+TEST_F(Library, KeepAliveIsRaisedWhileTheExportIsCompressedAndWritten) {
+  SequenceData data;
+  for (int c = 0; c < 50; ++c) {
+    SequenceChannel channel{"c" + std::to_string(c), {kFamilyDMX, 1, 0, c + 1}, {}};
+    for (int i = 0; i < 40; ++i) channel.effects.push_back({i * 25, 25, kEffectFade, 0, 100, 0});
+    data.channels.push_back(channel);
+  }
+  std::string path = dir.Write("big.tseq", WritePlainSequence(data));
+  // Each step of the export takes longer than the keep-alive interval.
+  struct BusyClock : Clock {
+    DateTime Now() const override { return DateTime(); }
+    uint32_t TickCount() const override { return m_tick += 60; }
+    mutable uint32_t m_tick = 0;
+  };
+  FileSequenceLibrary busy(std::make_shared<BusyClock>(), fs, resolver);
+  auto sequence = busy.CreateSequence();
+  int raised = 0;
+  sequence->SetKeepAlive([&] { ++raised; });
+  sequence->LoadFile(path);
+  raised = 0;
+  busy.WriteCompressed(*sequence, path + ".tcs");
+  // While compressing, and around writing and syncing the file.
+  EXPECT_GE(raised, 3);
+  EXPECT_TRUE(sequence->HasBeenExported());
+}
+
+TEST_F(Library, NestedIncludesAreListedAndHashedWhereTheyWereFound) {
+  // main includes parts/one (at 1000), which includes two beside it (at 50).
+  std::string two = dir.Write("parts/two.tseq", R"({"tessavar_sequence": 1, "length_ms": 10})");
+  std::string one = dir.Write(
+      "parts/one.tseq",
+      R"({"tessavar_sequence": 1, "subsequences": [{"file": "two.tseq", "offset_ms": 50}]})");
+  std::string main = dir.Write(
+      "main.tseq",
+      R"({"tessavar_sequence": 1, "subsequences": [{"file": "parts/one.tseq", "offset_ms": 1000}]})");
+  auto sequence = library.CreateSequence();
+  sequence->LoadFile(main);
+  EXPECT_EQ(sequence->SubsequenceNames(), std::vector<std::string>{"parts/one.tseq"});
+  library.WriteCompressed(*sequence, main + ".tcs");
+  auto exported = library.LoadCompressed(main + ".tcs");
+  ASSERT_EQ(exported->Info().subsequences.size(), 2u);
+  EXPECT_EQ(exported->Info().subsequences[0].file, one);
+  EXPECT_EQ(exported->Info().subsequences[0].offsetMs, 1000);
+  EXPECT_EQ(exported->Info().subsequences[1].file, two);
+  EXPECT_EQ(exported->Info().subsequences[1].offsetMs, 1050);
+
+  uint64_t recorded = exported->Info().sourceHash;
+  EXPECT_EQ(library.CurrentSourceHash(main, exported->SubsequenceNames()), recorded);
+  dir.Write("parts/two.tseq", R"({"tessavar_sequence": 1, "length_ms": 20})");
+  EXPECT_NE(library.CurrentSourceHash(main, exported->SubsequenceNames()), recorded);
+  std::filesystem::remove(two);
+  EXPECT_EQ(library.CurrentSourceHash(main, exported->SubsequenceNames()), std::nullopt);
 }
 
 TEST_F(Library, MemoryWhilePlayingAnFseqIsOneBlockWhateverTheLength) {

@@ -6,6 +6,7 @@
 // fake times; the real one is an adapter (platform/LocalFileSystem.h).
 
 #include <cstdint>
+#include <functional>
 #include <memory>
 #include <string>
 #include <string_view>
@@ -36,6 +37,13 @@ class FileSystem {
   // Replaces the file as a whole (a temporary beside it, then a rename), so
   // a reader never sees half a file. Throws the access error (75).
   virtual void WriteAll(const std::string& path, std::string_view bytes) = 0;
+  // The same, calling `progress` now and then while a large file is written
+  // and synced (a file system that cannot tell just writes).
+  virtual void WriteAll(const std::string& path, std::string_view bytes,
+                        const std::function<void()>& progress) {
+    (void)progress;
+    WriteAll(path, bytes);
+  }
   // Names (not paths) of the entries of a directory; empty when it cannot be
   // read.
   virtual std::vector<std::string> ListDirectory(const std::string& path) const = 0;

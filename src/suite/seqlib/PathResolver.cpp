@@ -59,11 +59,29 @@ bool PathResolver::Present(const std::string& path, int32_t kind) const {
   return kind == kKindSequence && m_fileSystem->Stat(path + "." + kCompressedExtension).IsFile();
 }
 
+const PathResolver::Listing& PathResolver::ListingOf(const std::string& folder) const {
+  FileStatus status = m_fileSystem->Stat(folder);
+  Listing& listing = m_listings[folder];
+  bool exists = status.exists && status.isDirectory;
+  if (listing.listed && listing.exists == exists && listing.modifiedNs == status.modifiedNs) {
+    return listing;
+  }
+  listing = Listing{true, exists, status.modifiedNs, {}};
+  if (!exists) return listing;
+  for (auto& entry : m_fileSystem->ListDirectory(folder)) {
+    listing.byLowerName[Lower(entry)].push_back(std::move(entry));
+  }
+  return listing;
+}
+
 std::string PathResolver::FindIgnoringCase(const std::string& folder, const std::string& base,
                                            int32_t kind) const {
-  std::string wanted = Lower(base);
-  for (const auto& entry : m_fileSystem->ListDirectory(folder)) {
-    if (Lower(entry) == wanted && Present(folder + entry, kind)) return folder + entry;
+  const Listing& listing = ListingOf(folder);
+  auto it = listing.byLowerName.find(Lower(base));
+  if (it == listing.byLowerName.end()) return "";
+  // The listing may be older than the folder's content: check each name.
+  for (const auto& entry : it->second) {
+    if (Present(folder + entry, kind)) return folder + entry;
   }
   return "";
 }

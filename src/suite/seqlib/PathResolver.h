@@ -7,12 +7,19 @@
 // A sequence counts as present when its compressed export is.
 //
 // Asks for the folders at each use (the settings may change); shares the
-// file system.
+// file system. The search without regard to case works on a listing of the
+// folder kept from one search to the next and taken again when the folder's
+// modification time changes, so a show naming many missing files does not
+// list a large folder once per name. (A file added within the file system's
+// timestamp granularity of the listing is seen at the folder's next change;
+// exact names are always looked up afresh.) Single-threaded.
 
 #include <cstdint>
 #include <functional>
+#include <map>
 #include <memory>
 #include <string>
+#include <vector>
 
 #include "suite/seqlib/FileSystem.h"
 
@@ -41,12 +48,23 @@ class PathResolver {
   static bool IsForeignAbsolute(const std::string& name);
 
  private:
+  // A folder's entries by their lower-case names, as listed when the folder
+  // had the modification time noted.
+  struct Listing {
+    bool listed = false;
+    bool exists = false;
+    int64_t modifiedNs = 0;
+    std::map<std::string, std::vector<std::string>> byLowerName;
+  };
+
   bool Present(const std::string& path, int32_t kind) const;
   std::string FindIgnoringCase(const std::string& folder, const std::string& base,
                                int32_t kind) const;
+  const Listing& ListingOf(const std::string& folder) const;
 
   std::shared_ptr<const FileSystem> m_fileSystem;
   FolderLookup m_folders;
+  mutable std::map<std::string, Listing> m_listings;
 };
 
 }  // namespace tav

@@ -2,6 +2,8 @@
 
 #include <gtest/gtest.h>
 
+#include <filesystem>
+
 #include "platform/LocalFileSystem.h"
 #include "suite/seqlib/PlaybackFileCreator.h"
 #include "support/testing/TempFolder.h"
@@ -54,6 +56,49 @@ TEST_F(Resolving, FindsNamesInTheFolderOfTheirKind) {
   for (const auto& c : cases) {
     EXPECT_EQ(resolver->ResolvePath(c.name, c.kind), c.expected) << c.name << " kind " << c.kind;
   }
+}
+
+// The local file system, counting the folder listings asked of it.
+class CountingFileSystem : public FileSystem {
+ public:
+  explicit CountingFileSystem(std::shared_ptr<FileSystem> inner) : m_inner(std::move(inner)) {}
+  FileStatus Stat(const std::string& path) const override { return m_inner->Stat(path); }
+  std::unique_ptr<RandomAccessFile> OpenForRead(const std::string& path) const override {
+    return m_inner->OpenForRead(path);
+  }
+  void WriteAll(const std::string& path, std::string_view bytes) override {
+    m_inner->WriteAll(path, bytes);
+  }
+  std::vector<std::string> ListDirectory(const std::string& path) const override {
+    ++listings;
+    return m_inner->ListDirectory(path);
+  }
+  mutable int listings = 0;
+
+ private:
+  std::shared_ptr<FileSystem> m_inner;
+};
+
+TEST_F(Resolving, TheFolderIsListedOnceUntilItChanges) {
+  dir.Write("Sequences/Carol.tseq", "{}");
+  auto counting = std::make_shared<CountingFileSystem>(fs);
+  PathResolver cached(counting, PathResolver::DefaultFolders(dir.Path()));
+  for (const char* name : {"C:\\a\\missing.tseq", "gone.tseq", "C:\\b\\CAROL.TSEQ", "x.tseq"}) {
+    cached.ResolvePath(name, PathResolver::kKindSequence);
+  }
+  EXPECT_EQ(cached.ResolvePath("carol.tseq", 2), seq + "Carol.tseq");
+  EXPECT_EQ(counting->listings, 1);
+
+  // A file added later is found once the folder's time says it changed.
+  dir.Write("Sequences/Noel.tseq", "{}");
+  dir.SetModified("Sequences", 2000000000);
+  EXPECT_EQ(cached.ResolvePath("D:\\x\\noel.TSEQ", 2), seq + "Noel.tseq");
+  EXPECT_EQ(cached.ResolvePath("gone.tseq", 2), seq + "gone.tseq");
+  EXPECT_EQ(counting->listings, 2);
+  // A listed file that went away is not reported as found.
+  std::filesystem::remove(seq + "Noel.tseq");
+  dir.SetModified("Sequences", 2000000000);
+  EXPECT_EQ(cached.ResolvePath("noel.tseq", 2), seq + "noel.tseq");
 }
 
 TEST_F(Resolving, FoldersComeFromTheLookupAtEachUse) {

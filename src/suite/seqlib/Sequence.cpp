@@ -15,19 +15,24 @@ Sequence::Sequence(std::shared_ptr<const Clock> clock, SequenceLoader loader)
   if (!m_clock) throw errors::ObjectNotSet("Sequence");
 }
 
+std::function<void()> Sequence::KeepAliveRaiser() const {
+  if (!m_keepAlive) return [] {};
+  struct Pace {
+    uint32_t last = 0;
+    bool raised = false;
+  };
+  return [clock = m_clock, handler = m_keepAlive, pace = std::make_shared<Pace>()] {
+    uint32_t now = clock->TickCount();
+    if (pace->raised && now - pace->last < kKeepAliveIntervalMs) return;
+    pace->raised = true;
+    pace->last = now;
+    handler();
+  };
+}
+
 void Sequence::LoadFile(const std::string& path) {
   if (!m_loader) throw errors::ObjectNotSet("Sequence.LoadFile");
-  uint32_t last = m_clock->TickCount();
-  bool raised = false;
-  auto keepAlive = [this, &last, &raised] {
-    if (!m_keepAlive) return;
-    uint32_t now = m_clock->TickCount();
-    if (raised && now - last < kKeepAliveIntervalMs) return;
-    raised = true;
-    last = now;
-    m_keepAlive();
-  };
-  Attach(m_loader(path, keepAlive));
+  Attach(m_loader(path, KeepAliveRaiser()));
 }
 
 void Sequence::Attach(std::shared_ptr<const SequenceContent> content) {

@@ -56,9 +56,13 @@ class Sequence {
 
   Sequence(std::shared_ptr<const Clock> clock, SequenceLoader loader);
 
-  // The KeepAlive event: raised while a large file loads, so outputs keep
-  // refreshing although the loop is busy.
+  // The KeepAlive event: raised while a large file loads or its export is
+  // written, so outputs keep refreshing although the loop is busy.
   void SetKeepAlive(std::function<void()> handler) { m_keepAlive = std::move(handler); }
+  // For long work on this sequence (loading it, writing its export): a
+  // function to call now and then that raises KeepAlive at most every
+  // kKeepAliveIntervalMs, the first call always.
+  std::function<void()> KeepAliveRaiser() const;
   // Loads the file (format judged by content). Throws tav::Error.
   void LoadFile(const std::string& path);
   void Attach(std::shared_ptr<const SequenceContent> content);

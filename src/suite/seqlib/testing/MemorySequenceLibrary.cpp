@@ -98,4 +98,11 @@ void MemorySequenceLibrary::WriteCompressed(const Sequence& sequence, const std:
   if (it != m_state->plain.end()) *it->second.exported = true;
 }
 
+std::optional<uint64_t> MemorySequenceLibrary::CurrentSourceHash(const std::string& sequencePath,
+                                                                 const std::vector<std::string>&) {
+  auto it = m_state->plain.find(sequencePath);
+  if (it == m_state->plain.end()) return std::nullopt;
+  return it->second.compiled->sourceHash;
+}
+
 }  // namespace tav

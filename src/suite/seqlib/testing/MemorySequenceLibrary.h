@@ -30,6 +30,10 @@ class MemorySequenceLibrary : public SequenceLibrary {
   std::shared_ptr<Sequence> CreateSequence() override;
   std::shared_ptr<Sequence> LoadCompressed(const std::string& path) override;
   void WriteCompressed(const Sequence& sequence, const std::string& path) override;
+  // The source hash the plain sequence at the path was compiled with (0);
+  // an export written from it records the same.
+  std::optional<uint64_t> CurrentSourceHash(const std::string& sequencePath,
+                                            const std::vector<std::string>& includedFiles) override;
 
   const std::vector<std::string>& Loads() const { return m_loads; }
   const std::vector<std::string>& CompressedLoads() const { return m_compressedLoads; }
