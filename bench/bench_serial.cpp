@@ -28,13 +28,13 @@
 #include "platform/PosixSerialPort.h"
 #include "platform/SystemClock.h"
 #include "platform/testing/PtyDevice.h"
+#include "ports/testing/RecordingMessageLog.h"
 #include "suite/channelio/serial/DimmerFraming.h"
 #include "suite/channelio/serial/DimmerTransmitter.h"
 #include "suite/channelio/serial/SerialLineTiming.h"
 #include "suite/channelio/serial/X10Transmitter.h"
 #include "suite/channelio/serial/testing/Cm11aModel.h"
 #include "suite/channelio/serial/testing/DimmerBoardModel.h"
-#include "suite/channelio/serial/testing/RecordingMessageLog.h"
 
 namespace {
 
