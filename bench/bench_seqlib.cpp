@@ -9,21 +9,40 @@
 //    50 ms, and about the same for a file twice as long.
 // 3. Memory held while playing that file: a small multiple (at most 3x) of
 //    one decompressed compression block, whatever the file's length.
+// 4. Inspecting the compressed export made from that file (what showctl
+//    sequence inspect does) reads its headers only: under 50 ms and a peak
+//    of under 20 MiB resident for the whole process doing it.
+// 5. Converting it (FSEQ to export, FSEQ to plain, export to plain) and
+//    verifying it stream a block at a time: the process's peak resident
+//    memory stays within a few blocks of an idle one (at most 16 MiB more)
+//    and does not grow with the length (twice the frames, within 2 MiB).
+//
+// Figures 4 and 5 come from child processes (this program run again with
+// --child), so each peak is that of one operation alone in a process of its
+// own, as a user's showctl would see it.
 //
 // Exits non-zero when a target is missed. Run it from the release preset.
+
+#include <sys/wait.h>
+#include <unistd.h>
 
 #include <chrono>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <filesystem>
 #include <string>
 #include <vector>
 
 #include "platform/LocalFileSystem.h"
+#include "suite/seqlib/CompressedSequence.h"
+#include "suite/seqlib/CompressedSequenceWriter.h"
 #include "suite/seqlib/FileSequenceLibrary.h"
 #include "suite/seqlib/FseqFile.h"
 #include "suite/seqlib/FseqWriter.h"
 #include "suite/seqlib/PlainSequence.h"
+#include "suite/seqlib/PlainSequenceWriter.h"
+#include "suite/seqlib/SequenceSummary.h"
 
 namespace {
 
@@ -192,15 +211,169 @@ bool FseqFigures(tav::FileSequenceLibrary& library, tav::FileSystem& fs,
   return ok;
 }
 
+// ---- Figures 4 and 5: one operation per child process -----------------------
+
+// What a child did: its own time for the operation, and the peak resident
+// memory of its whole process.
+struct ChildFigures {
+  double ms = 0;
+  double peakMiB = 0;
+};
+
+// The peak resident memory of this process image, in KiB: VmHWM, which
+// starts afresh at exec (getrusage's ru_maxrss would carry the forking
+// parent's peak over).
+long PeakResidentKiB() {
+  std::FILE* status = std::fopen("/proc/self/status", "r");
+  if (!status) return -1;
+  char line[256];
+  long kib = -1;
+  while (std::fgets(line, sizeof line, status)) {
+    if (std::sscanf(line, "VmHWM: %ld kB", &kib) == 1) break;
+  }
+  std::fclose(status);
+  return kib;
+}
+
+ChildFigures RunChild(const std::vector<std::string>& args) {
+  int out[2];
+  if (::pipe(out) != 0) std::exit(2);
+  pid_t pid = ::fork();
+  if (pid == 0) {
+    ::dup2(out[1], STDOUT_FILENO);
+    ::close(out[0]);
+    ::close(out[1]);
+    std::vector<char*> argv;
+    std::string self = "/proc/self/exe", child = "--child";
+    argv.push_back(self.data());
+    argv.push_back(child.data());
+    for (const auto& a : args) argv.push_back(const_cast<char*>(a.c_str()));
+    argv.push_back(nullptr);
+    ::execv(argv[0], argv.data());
+    std::_Exit(127);
+  }
+  ::close(out[1]);
+  std::string text;
+  char buffer[256];
+  for (ssize_t n; (n = ::read(out[0], buffer, sizeof buffer)) > 0;) text.append(buffer, n);
+  ::close(out[0]);
+  int status = 0;
+  ::waitpid(pid, &status, 0);
+  ChildFigures figures;
+  long kib = 0;
+  if (!WIFEXITED(status) || WEXITSTATUS(status) != 0 ||
+      std::sscanf(text.c_str(), "%lf %ld", &figures.ms, &kib) != 2) {
+    std::fprintf(stderr, "child %s failed: %s\n", args[0].c_str(), text.c_str());
+    std::exit(3);
+  }
+  figures.peakMiB = kib / 1024.0;
+  return figures;
+}
+
+// Runs one operation and prints how long it took.
+int ChildMain(int argc, char** argv) {
+  std::vector<std::string> args(argv + 2, argv + argc);
+  auto fs = tav::LocalFileSystem();
+  auto resolver = std::make_shared<tav::PathResolver>(fs, [](int32_t) { return std::string(); });
+  tav::FileSequenceLibrary library(std::make_shared<BenchClock>(), fs, resolver);
+  const std::string& mode = args.at(0);
+  auto start = Steady::now();
+  if (mode == "idle") {
+    // Nothing: the resident memory of the program itself.
+  } else if (mode == "inspect") {
+    auto stream = library.OpenStreamed(args.at(1));
+    tav::SequenceSummary s = tav::Summarize(stream->Head(), stream->Groups());
+    if (s.levelBlocks == 0) return 4;
+  } else if (mode == "load-whole") {
+    tav::CompiledSequence whole = tav::ReadCompressedSequence(fs->ReadAll(args.at(1)), args.at(1));
+    if (whole.tracks.empty()) return 4;
+  } else if (mode == "verify") {
+    auto stream = library.OpenStreamed(args.at(1));
+    while (stream->NextFrame()) {
+    }
+  } else if (mode == "to-tcs" || mode == "to-plain") {
+    auto source = library.OpenStreamed(args.at(1), true);
+    auto out = fs->OpenForWrite(args.at(2));
+    if (mode == "to-tcs") {
+      tav::WriteCompressedSequence(*source, *out);
+    } else {
+      tav::WritePlainSequence(*source, *out);
+    }
+    out->Commit();
+  } else {
+    return 5;
+  }
+  std::printf("%.3f %ld\n", MsSince(start), PeakResidentKiB());
+  return 0;
+}
+
+bool StreamingFigures(tav::FileSystem& fs, const std::string& folder) {
+  bool ok = true;
+  const std::string shortFile = folder + "show.fseq", longFile = folder + "show-twice.fseq";
+  const double blockMiB = static_cast<double>(kBlockFrames) * kFseqChannels / (1 << 20);
+  ChildFigures idle = RunChild({"idle"});
+  std::printf(
+      "\nOne operation per process (idle process: %.1f MiB resident; one FSEQ block is "
+      "%.2f MiB)\n",
+      idle.peakMiB, blockMiB);
+
+  RunChild({"to-tcs", shortFile, folder + "show.tcs"});
+  RunChild({"to-tcs", longFile, folder + "show-twice.tcs"});
+  ChildFigures inspect = RunChild({"inspect", folder + "show.tcs"});
+  ChildFigures whole = RunChild({"load-whole", folder + "show.tcs"});
+  bool inspectOk = inspect.ms < 50 && inspect.peakMiB < 20;
+  std::printf(
+      "  inspect the export of the 2,400-frame file (%.0f KB): %.2f ms, peak %.1f MiB (target: "
+      "under 50 ms and 20 MiB) %s\n",
+      fs.Stat(folder + "show.tcs").size / 1e3, inspect.ms, inspect.peakMiB,
+      inspectOk ? "ok" : "MISSED");
+  std::printf("    (loading that export whole, as the player does: %.0f ms, peak %.1f MiB)\n",
+              whole.ms, whole.peakMiB);
+  ok = ok && inspectOk;
+
+  struct Job {
+    const char* what;
+    std::string mode, in, out, inTwice, outTwice;
+  } jobs[] = {
+      {"FSEQ to export", "to-tcs", shortFile, folder + "a.tcs", longFile, folder + "b.tcs"},
+      {"FSEQ to plain", "to-plain", shortFile, folder + "a.tseq", longFile, folder + "b.tseq"},
+      {"export to plain", "to-plain", folder + "show.tcs", folder + "c.tseq",
+       folder + "show-twice.tcs", folder + "d.tseq"},
+      {"verify the export", "verify", folder + "show.tcs", "", folder + "show-twice.tcs", ""},
+      {"verify the FSEQ file", "verify", shortFile, "", longFile, ""},
+  };
+  for (const Job& job : jobs) {
+    std::vector<std::string> one{job.mode, job.in}, two{job.mode, job.inTwice};
+    if (!job.out.empty()) one.push_back(job.out), two.push_back(job.outTwice);
+    ChildFigures a = RunChild(one);
+    ChildFigures b = RunChild(two);
+    double overIdle = std::max(a.peakMiB, b.peakMiB) - idle.peakMiB;
+    bool jobOk = overIdle <= 16 && b.peakMiB - a.peakMiB <= 2;
+    std::printf(
+        "  %-20s 2,400 frames: %6.0f ms, peak %5.1f MiB; 4,800 frames: %6.0f ms, peak %5.1f MiB "
+        "(%.1f MiB over idle = %.1f blocks; target: at most 16 MiB, not growing) %s\n",
+        job.what, a.ms, a.peakMiB, b.ms, b.peakMiB, overIdle, overIdle / blockMiB,
+        jobOk ? "ok" : "MISSED");
+    ok = ok && jobOk;
+    if (!job.out.empty()) {
+      std::filesystem::remove(job.out);
+      std::filesystem::remove(job.outTwice);
+    }
+  }
+  return ok;
+}
+
 }  // namespace
 
-int main() {
+int main(int argc, char** argv) {
+  if (argc >= 3 && std::strcmp(argv[1], "--child") == 0) return ChildMain(argc, argv);
   std::string folder = MakeFolder();
   auto fs = tav::LocalFileSystem();
   auto resolver = std::make_shared<tav::PathResolver>(fs, [&](int32_t) { return folder; });
   tav::FileSequenceLibrary library(std::make_shared<BenchClock>(), fs, resolver);
   bool ok = PlainVersusExport(library, *fs, folder);
   ok = FseqFigures(library, *fs, folder) && ok;
+  ok = StreamingFigures(*fs, folder) && ok;
   std::filesystem::remove_all(folder);
   std::printf("\n%s\n", ok ? "all targets met" : "TARGET MISSED");
   return ok ? 0 : 1;

@@ -4,6 +4,7 @@
 
 #include <chrono>
 #include <iostream>
+#include <set>
 
 #include "CommandRegistry.h"
 
@@ -12,9 +13,14 @@
 namespace tav::showctl {
 
 FileRegistryStore OpenSettingsStore(const std::string& file) {
-  return FileRegistryStore(
-      file.empty() ? RegistryFilePath() : file,
-      [](const std::string& problem) { std::cerr << "showctl: warning: " << problem << "\n"; });
+  // Several commands open the file more than once (the user data folder is
+  // read from it too); a damaged line is worth one warning.
+  return FileRegistryStore(file.empty() ? RegistryFilePath() : file,
+                           [](const std::string& problem) {
+                             static std::set<std::string> reported;
+                             if (reported.insert(problem).second)
+                               std::cerr << "showctl: warning: " << problem << "\n";
+                           });
 }
 
 void FinishWriting(FileRegistryStore& store) {

@@ -2,7 +2,8 @@
 // The settings file as showctl commands open it: the file given with --file,
 // else the one the player reads ($TAV_REGISTRY_FILE, else the user's config
 // folder). Lines the store cannot read are reported on standard error as
-// warnings and otherwise left alone.
+// warnings, each once per run however often the file is read, and otherwise
+// left alone.
 
 #include <string>
 

@@ -1,15 +1,21 @@
 #include "UserData.h"
 
+#include <optional>
+
+#include "SettingsStore.h"
 #include "config/Settings.h"
-#include "platform/FileRegistryStore.h"
 #include "platform/PlatformPaths.h"
 
 namespace tav::showctl {
 
 std::string UserDataFolder() {
-  FileRegistryStore store(RegistryFilePath());
-  Settings settings(store, SystemPathDefaults());
-  return settings.UserDataPath();
+  static std::optional<std::string> folder;
+  if (!folder) {
+    FileRegistryStore store = OpenSettingsStore("");
+    Settings settings(store, SystemPathDefaults());
+    folder = settings.UserDataPath();
+  }
+  return *folder;
 }
 
 }  // namespace tav::showctl

@@ -8,7 +8,7 @@
 
 namespace tav::showctl {
 
-// Ends with '/'.
+// Ends with '/'. Read once per run.
 std::string UserDataFolder();
 
 }  // namespace tav::showctl

@@ -24,6 +24,7 @@
 #include <vector>
 
 #include "CommandRegistry.h"
+#include "ScheduleCheck.h"
 #include "platform/LocalTextFiles.h"
 #include "schedule/Schedule.h"
 #include "schedule/ScheduleFileCheck.h"
@@ -32,11 +33,6 @@
 #include "schedule/YearSchedule.h"
 #include "support/Error.h"
 #include "support/Serialize.h"
-
-#if __has_include("show/ShowFunctions.h")
-#include "show/ShowFunctions.h"
-#define TAV_SHOWCTL_HAS_SHOW_FILES 1
-#endif
 
 namespace tav::showctl {
 namespace {
@@ -235,6 +231,14 @@ void List(const ScheduleOptions& o) {
   }
 }
 
+// The show file may come later, so a missing one is added all the same.
+void WarnAboutShowFile(const std::string& name) {
+  if (auto problem = ShowFileProblem(name)) {
+    std::cerr << fmt::format("showctl: warning: the show file \"{}\" {}; added all the same\n",
+                             name, *problem);
+  }
+}
+
 void AddWeekly(const ScheduleOptions& o) {
   auto start = WeekTimeArgument(o.from, "start");
   auto end = WeekTimeArgument(o.to, "end");
@@ -269,6 +273,7 @@ void AddWeekly(const ScheduleOptions& o) {
   Saved(week->Save(path, files), path);
   std::cout << fmt::format("Added weekly show \"{}\" from {} to {} to {}\n", o.file,
                            WeekTimeToDisplay(*start), WeekTimeToDisplay(*end), path);
+  WarnAboutShowFile(o.file);
 }
 
 void AddDated(const ScheduleOptions& o) {
@@ -293,6 +298,7 @@ void AddDated(const ScheduleOptions& o) {
   Saved(year->Save(path, files), path);
   std::cout << fmt::format("Added dated show \"{}\" from {} to {} to {}\n", o.file, start.ToText(),
                            end.ToText(), path);
+  WarnAboutShowFile(o.file);
 }
 
 void RemoveWeekly(const ScheduleOptions& o) {
@@ -331,85 +337,8 @@ void RemoveDated(const ScheduleOptions& o) {
   throw CommandFailed(fmt::format("no dated show runs at {} in {}", at.ToText(), path));
 }
 
-void PrintFindings(const FileCheck& check) {
-  for (const auto& finding : check.Findings) {
-    std::cout << (finding.IsProblem ? "  problem: " : "  ") << finding.Text << "\n";
-  }
-}
-
-// Which kind of file to check: by the player's own file names, else by the
-// content. A week schedule's records have a file reference list as their
-// third field, a year schedule's start with a date; a show file's first
-// field is a playlist, whose third field is a number.
-std::string KindOf(const std::string& path, const std::string& text) {
-  std::string name = fs::path(path).filename().string();
-  if (name == "weeksched.tsc") return "week";
-  if (name == "yearsched.tsc") return "year";
-  if (text.find('(') == std::string::npos) return "week";
-  if (LooksLikeYearSchedule(text)) return "year";
-  try {
-    TextArray records = ListFromText(text, 1);
-    if (ArrayCount(records) >= 1) {
-      TextArray first = ListFromText(records[1], 1);
-      if (ArrayCount(first) >= 3 && first[3].find('(') != std::string::npos) return "week";
-      return "show";
-    }
-  } catch (const tav::Error&) {
-  }
-  return fs::path(path).extension() == ".tsc" ? "week" : "show";
-}
-
-void CheckShowFile(const std::string& text, int& problems) {
-#ifdef TAV_SHOWCTL_HAS_SHOW_FILES
-  try {
-    auto show = ShowFromText(text);
-    if (!show) {
-      std::cout << "  problem: one of its playlists cannot be read; the player cannot run this "
-                   "show\n";
-      ++problems;
-      return;
-    }
-    std::cout << fmt::format(
-        "  {} startup, {} main, {} musical, {} background and {} shutdown sequence(s)\n",
-        show->Startup()->Count(), show->Main()->Count(), show->Musical()->Count(),
-        show->Background()->Count(), show->Shutdown()->Count());
-  } catch (const tav::Error& e) {
-    std::cout << "  problem: the show file is not a well-formed list (" << e.Description() << ")\n";
-    ++problems;
-  }
-#else
-  (void)text;
-  (void)problems;
-  throw CommandFailed("this showctl was built without show files; it can check schedules only");
-#endif
-}
-
 void Check(const ScheduleOptions& o) {
-  LocalTextFiles files;
-  std::optional<std::string> text;
-  try {
-    text = files.ReadText(o.file);
-  } catch (const tav::Error& e) {
-    throw CommandFailed(fmt::format("cannot read {}: {}", o.file, e.Description()));
-  }
-  if (!text) throw CommandFailed(fmt::format("there is no file {}", o.file));
-  std::string kind = o.kind == "auto" ? KindOf(o.file, *text) : o.kind;
-
-  int problems = 0;
-  if (kind == "show") {
-    std::cout << o.file << " (show file):\n";
-    CheckShowFile(*text, problems);
-  } else {
-    std::cout << o.file << (kind == "year" ? " (year schedule):\n" : " (week schedule):\n");
-    FileCheck check = kind == "year" ? CheckYearScheduleText(*text) : CheckWeekScheduleText(*text);
-    PrintFindings(check);
-    problems = static_cast<int>(std::count_if(check.Findings.begin(), check.Findings.end(),
-                                              [](const auto& f) { return f.IsProblem; }));
-  }
-  if (problems > 0) {
-    throw CommandFailed(fmt::format("{} problem(s) in {}", problems, o.file));
-  }
-  std::cout << "  OK\n";
+  CheckFiles({o.file, o.kind, WeekPath(o), YearPath(o)});
 }
 
 void PrintDecision(const char* label, const ShowDecision& d) {
@@ -427,8 +356,26 @@ void PrintDecision(const char* label, const ShowDecision& d) {
   std::cout << fmt::format("  {:<8} because {}\n", "", d.Reason);
 }
 
+// A date and time, or a day and time of the week: the next such moment from
+// now (now itself when it is that moment).
+DateTime MomentArgument(const std::string& text) {
+  if (auto weekly = WeekTimeFromInput(text)) {
+    DateTime now = Now();
+    int64_t ahead = ((*weekly)->TimeVal() - WeekTimeFromDate(now)->TimeVal() + kSecondsPerWeek) %
+                    kSecondsPerWeek;
+    return now.AddSeconds(ahead);
+  }
+  if (!DateTime::FromText(text)) {
+    throw CommandFailed(fmt::format(
+        "the asked time \"{}\" is neither a date and time such as \"2024-12-24 18:00\" nor a day "
+        "and time such as \"Mon 19:00\"",
+        text));
+  }
+  return DateTimeArgument(text, "asked");
+}
+
 void At(const ScheduleOptions& o) {
-  DateTime t = o.at.empty() ? Now() : DateTimeArgument(o.at, "asked");
+  DateTime t = o.at.empty() ? Now() : MomentArgument(o.at);
   LocalTextFiles files;
   ScheduleState state;
   state.Week = ReadWeek(WeekPath(o), files);
@@ -491,15 +438,20 @@ void Register(CLI::App& app) {
   removeDated->callback([o] { RemoveDated(*o); });
 
   auto* check = schedule->add_subcommand(
-      "check", "Check a week schedule, year schedule or show file and explain what is wrong");
-  check->add_option("file", o->file, "File to check")->required();
+      "check",
+      "Check a week schedule, year schedule or show file and explain what is wrong, and check "
+      "every show file a schedule names; without a file, the usual week and year schedules");
+  check->add_option("file", o->file, "File to check (default: the week and year schedules)");
   check->add_option("--as", o->kind, "What the file is (default: tell by its name and content)")
       ->check(CLI::IsMember({"auto", "week", "year", "show"}));
+  fileOptions(check);
   check->callback([o] { Check(*o); });
 
   auto* at = schedule->add_subcommand(
       "at", "Which show the player would run at a time, which comes next, and why");
-  at->add_option("time", o->at, "Date and time, \"2024-12-24 19:00\" (default: now)");
+  at->add_option("time", o->at,
+                 "Date and time, \"2024-12-24 19:00\", or a day and time, \"Mon 19:00\" (the "
+                 "next such moment); default: now");
   at->add_flag("--on-demand-only", o->onDemandOnly,
                "As the player started with /noschedule: the schedules do not count");
   fileOptions(at);

@@ -263,25 +263,25 @@ void Register(CLI::App& app) {
       "list", "List every setting the player reads, then any other stored values");
   list->callback([o] { List(*o); });
 
-  auto* import = settings->add_subcommand(
+  auto* importCmd = settings->add_subcommand(
       "import",
       "Merge a registry export file (Windows 5.00 in UTF-16 or UTF-8, or REGEDIT4) into the "
       "settings; nothing changes if it has unreadable lines");
-  import->add_option("file", o->path, "Export file to read, - for standard input")->required();
-  import->add_flag("--skip-bad-lines", o->skipBadLines,
-                   "Import the readable lines even if others cannot be read");
-  import->callback([o] { Import(*o);
-});
+  importCmd->add_option("file", o->path, "Export file to read, - for standard input")->required();
+  importCmd->add_flag("--skip-bad-lines", o->skipBadLines,
+                      "Import the readable lines even if others cannot be read");
+  importCmd->callback([o] { Import(*o); });
 
-auto* exportCmd = settings->add_subcommand(
-    "export", "Write the settings as a registry export file (to standard output by default)");
-exportCmd->add_option("file", o->path, "File to write, - for standard output");
-exportCmd->add_flag("--utf16", o->utf16,
-                    "Write UTF-16 with a byte-order mark, as Windows' registry editor expects");
-exportCmd->callback([o] { Export(*o); });
+  auto* exportCmd = settings->add_subcommand(
+      "export", "Write the settings as a registry export file (to standard output by default)");
+  exportCmd->add_option("file", o->path, "File to write, - for standard output");
+  exportCmd->add_flag("--utf16", o->utf16,
+                      "Write UTF-16 with a byte-order mark, as Windows' registry editor expects");
+  exportCmd->callback([o] { Export(*o); });
+}
+
 }  // namespace
 
-CommandGroup reg{"settings", Register};
+static CommandGroup reg{"settings", Register};
 
-}  // namespace tav::showctl
 }  // namespace tav::showctl

@@ -46,6 +46,9 @@ const std::vector<SettingDescription>& KnownSettings() {
       Describe(kAppPath),
       Describe(kUserDataPath),
       Describe(kUseCompressedSequences),
+      Describe(kAudioOutput),
+      Describe(kAudioDevice),
+      Describe(kVideoOutput),
   };
   return all;
 }

@@ -12,7 +12,10 @@
 // until the value reads again. Failures of the registry itself still raise.
 //
 // `UseCompressedSequences` lives in the section "Sequences", beside the
-// sequence folder settings of the sequence library.
+// sequence folder settings of the sequence library. The section "Media"
+// chooses the media player's outputs: `AudioOutput` and `VideoOutput` name
+// mpv outputs ("pulse", "alsa", "null"; "gpu", "drm", "null"), `AudioDevice`
+// one of the audio output's devices; empty means mpv's own choice.
 //
 // Owned by the host; the store and the log must outlive it. The platform
 // supplies the folder defaults and separator (PathDefaults), so this stays
@@ -71,6 +74,9 @@ inline constexpr BooleanSetting kThrottleDatagrams{"Visualizer", "ThrottleDatagr
 inline constexpr StringSetting kAppPath{"", "AppPath", ""};
 inline constexpr StringSetting kUserDataPath{"", "UserDataPath", ""};
 inline constexpr BooleanSetting kUseCompressedSequences{"Sequences", "UseCompressedSequences", true};
+inline constexpr StringSetting kAudioOutput{"Media", "AudioOutput", ""};
+inline constexpr StringSetting kAudioDevice{"Media", "AudioDevice", ""};
+inline constexpr StringSetting kVideoOutput{"Media", "VideoOutput", ""};
 // clang-format on
 }  // namespace settings
 
@@ -130,6 +136,9 @@ class Settings {
   int32_t MaxDatagramsPerCycle() const { return Get(settings::kMaxDatagramsPerCycle); }
   bool ThrottleDatagrams() const { return Get(settings::kThrottleDatagrams); }
   bool UseCompressedSequences() const { return Get(settings::kUseCompressedSequences); }
+  std::string AudioOutput() const { return Get(settings::kAudioOutput); }
+  std::string AudioDevice() const { return Get(settings::kAudioDevice); }
+  std::string VideoOutput() const { return Get(settings::kVideoOutput); }
 
   // Read at the first call, ending with the separator. An empty AppPath is
   // the program's folder; an empty UserDataPath the platform's user data

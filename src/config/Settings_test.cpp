@@ -55,6 +55,9 @@ TEST_F(SettingsTest, EverySettingHasItsSectionTypeAndDefault) {
                       "|AppPath|string|",
                       "|UserDataPath|string|",
                       "Sequences|UseCompressedSequences|boolean|true",
+                      "Media|AudioOutput|string|",
+                      "Media|AudioDevice|string|",
+                      "Media|VideoOutput|string|",
                   }));
 }
 

@@ -94,8 +94,12 @@ void ServiceCore::RunDue() {
     // past (the loop was busy) counts from now instead, so missed ticks are
     // not queued up.
     const auto interval = std::chrono::milliseconds(next->interval);
-    *next->deadline += interval;
-    if (*next->deadline <= now) next->deadline = now + interval;
+    if (next->interval == 0) {
+      next->deadline.reset();  // ticks only when asked again
+    } else {
+      *next->deadline += interval;
+      if (*next->deadline <= now) next->deadline = now + interval;
+    }
     next->armOrder = ++armSequence;
     std::string name = next->name;
     std::shared_ptr<std::function<void()>> onTick = next->onTick;
@@ -146,6 +150,15 @@ class AsioTimer : public Timer {
   }
   void SetOnTick(std::function<void()> onTick) override {
     m_state.onTick = std::make_shared<std::function<void()>>(std::move(onTick));
+  }
+  void SetNextTickIn(uint32_t milliseconds) override {
+    if (!m_state.enabled) return;
+    // A deadline of now, set from a handler, is later than the moment the
+    // running batch of due ticks was taken, so it fires on the next turn of
+    // the loop rather than inside this one.
+    m_state.deadline = SteadyClock::now() + std::chrono::milliseconds(milliseconds);
+    m_state.armOrder = ++m_core->armSequence;
+    m_core->Rearm();
   }
 
  private:

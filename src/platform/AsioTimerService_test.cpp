@@ -112,6 +112,35 @@ TEST(AsioTimerService, EscapingFailureIsReportedAndTheTimerGoesOn) {
                                                "tmrCheckRegistry: callback failed"}));
 }
 
+TEST(AsioTimerService, NextTickInWakesASleepingTimerOnTheNextTurnOfTheLoop) {
+  EventLoop loop;
+  AsioTimerService timers(loop);
+  std::vector<std::string> order;
+  // A timer asleep for an hour, and a zero-interval timer that ticks only
+  // when asked.
+  std::unique_ptr<Timer> sleeper;
+  sleeper = timers.CreateTimer("sleeper", 3'600'000, true, [&] {
+    order.push_back("sleeper");
+    if (order.size() >= 4) loop.Stop();
+  });
+  std::unique_ptr<Timer> oneShot = timers.CreateTimer("once", 0, true, [&] {
+    order.push_back("once");
+    sleeper->SetNextTickIn(0);
+  });
+  std::unique_ptr<Timer> starter;
+  starter = timers.CreateTimer("starter", 1, true, [&] {
+    order.push_back("starter");
+    starter->SetEnabled(false);
+    oneShot->SetNextTickIn(2);
+    sleeper->SetNextTickIn(0);
+    // Not run inside this batch: the tick comes after this handler.
+    order.push_back("starter done");
+  });
+  loop.Run();
+  EXPECT_EQ(order,
+            (std::vector<std::string>{"starter", "starter done", "sleeper", "once", "sleeper"}));
+}
+
 TEST(EventLoop, PostedWorkAndSignalsRunOnTheLoop) {
   EventLoop loop;
   std::vector<std::string> seen;

@@ -48,6 +48,37 @@ class LocalFile : public RandomAccessFile {
   std::string m_name;
 };
 
+class LocalWritableFile : public WritableFile {
+ public:
+  explicit LocalWritableFile(std::string path) : m_path(std::move(path)) {
+    Check(m_file.Open(m_path));
+  }
+
+  void Append(std::string_view bytes) override {
+    Check(m_file.Append(bytes));
+    m_size += bytes.size();
+  }
+  void WriteAt(uint64_t offset, std::string_view bytes) override {
+    if (offset > m_size || bytes.size() > m_size - offset) {
+      throw seqerrors::FileAccess("FileSystem.WriteAt", m_path + ": write past the end");
+    }
+    Check(m_file.WriteAt(offset, bytes));
+  }
+  uint64_t Size() const override { return m_size; }
+  void Commit() override { Check(m_file.Commit()); }
+
+ private:
+  void Check(int error) const {
+    if (error != 0) {
+      throw seqerrors::FileAccess("FileSystem.Write", m_path + ": " + std::strerror(error));
+    }
+  }
+
+  std::string m_path;
+  ReplacementFile m_file;
+  uint64_t m_size = 0;
+};
+
 class LocalFileSystemImpl : public FileSystem {
  public:
   FileStatus Stat(const std::string& path) const override {
@@ -88,6 +119,10 @@ class LocalFileSystemImpl : public FileSystem {
     }
   }
 
+  std::unique_ptr<WritableFile> OpenForWrite(const std::string& path) override {
+    return std::make_unique<LocalWritableFile>(path);
+  }
+
   std::vector<std::string> ListDirectory(const std::string& path) const override {
     std::vector<std::string> names;
     DIR* dir = ::opendir(path.c_str());
@@ -102,13 +137,6 @@ class LocalFileSystemImpl : public FileSystem {
 };
 
 }  // namespace
-
-std::string FileSystem::ReadAll(const std::string& path) const {
-  auto file = OpenForRead(path);
-  std::string bytes(file->Size(), '\0');
-  ReadExactly(*file, 0, bytes.data(), bytes.size(), "FileSystem.ReadAll", "the whole file");
-  return bytes;
-}
 
 std::shared_ptr<FileSystem> LocalFileSystem() {
   return std::make_shared<LocalFileSystemImpl>();

@@ -89,11 +89,13 @@ int RemoveStaleTemporaries(const std::string& folder) {
   return removed;
 }
 
-int ReplaceFileContents(const std::string& linkOrPath, std::string_view bytes, struct stat* written,
-                        const std::function<void()>& progress) {
-  auto tell = [&progress] {
-    if (progress) progress();
-  };
+ReplacementFile::~ReplacementFile() {
+  if (m_fd >= 0) ::close(m_fd);
+  if (!m_temporary.empty() && !m_committed) ::unlink(m_temporary.c_str());
+}
+
+int ReplacementFile::Open(const std::string& linkOrPath, std::function<void()> progress) {
+  m_progress = std::move(progress);
   std::string path;
   if (int error = FinalTarget(linkOrPath, path); error != 0) return error;
   struct stat existing {};
@@ -101,17 +103,11 @@ int ReplaceFileContents(const std::string& linkOrPath, std::string_view bytes, s
   if (exists && S_ISDIR(existing.st_mode)) return EISDIR;
 
   std::string temporary = TemporaryPrefixFor(path) + std::to_string(::getpid()) + "-XXXXXX";
-  FileDescriptor fd(::mkstemp(temporary.data()));
-  if (fd.Get() < 0) return errno;
-  bool renamed = false;
-  struct RemoveUnlessRenamed {
-    const std::string& name;
-    const bool& renamed;
-    ~RemoveUnlessRenamed() {
-      if (!renamed) ::unlink(name.c_str());
-    }
-  } cleanup{temporary, renamed};
-
+  int fd = ::mkstemp(temporary.data());
+  if (fd < 0) return errno;
+  m_path = path;
+  m_temporary = temporary;
+  m_fd = fd;
   // mkstemp makes the file private; give it the target's mode, or the usual
   // mode of a new file under the process's umask.
   mode_t mode = exists ? (existing.st_mode & 07777) : 0666;
@@ -120,35 +116,74 @@ int ReplaceFileContents(const std::string& linkOrPath, std::string_view bytes, s
     ::umask(mask);
     mode &= ~mask;
   }
-  if (::fchmod(fd.Get(), mode) != 0) return errno;
+  if (::fchmod(m_fd, mode) != 0) return errno;
+  return 0;
+}
 
-  size_t done = 0, reported = 0;
+void ReplacementFile::Tell() {
+  if (m_progress) m_progress();
+}
+
+int ReplacementFile::Append(std::string_view bytes) {
+  if (m_fd < 0) return EBADF;
+  size_t done = 0;
   while (done < bytes.size()) {
-    ssize_t n =
-        ::write(fd.Get(), bytes.data() + done, std::min(bytes.size() - done, kProgressBytes));
+    ssize_t n = ::write(m_fd, bytes.data() + done, std::min(bytes.size() - done, kProgressBytes));
     if (n < 0) {
       if (errno == EINTR) continue;
       return errno;
     }
     done += static_cast<size_t>(n);
-    if (done - reported >= kProgressBytes || done == bytes.size()) {
-      reported = done;
-      tell();
+    m_unreported += static_cast<size_t>(n);
+    if (m_unreported >= kProgressBytes) {
+      m_unreported = 0;
+      Tell();
     }
   }
-  if (::fsync(fd.Get()) != 0) return errno;
-  tell();
-  if (written != nullptr && ::fstat(fd.Get(), written) != 0) return errno;
-  if (::close(fd.Release()) != 0) return errno;
-  if (::rename(temporary.c_str(), path.c_str()) != 0) return errno;
-  renamed = true;
-  tell();
+  return 0;
+}
+
+int ReplacementFile::WriteAt(uint64_t offset, std::string_view bytes) {
+  if (m_fd < 0) return EBADF;
+  size_t done = 0;
+  while (done < bytes.size()) {
+    ssize_t n =
+        ::pwrite(m_fd, bytes.data() + done, bytes.size() - done, static_cast<off_t>(offset + done));
+    if (n < 0) {
+      if (errno == EINTR) continue;
+      return errno;
+    }
+    done += static_cast<size_t>(n);
+  }
+  return 0;
+}
+
+int ReplacementFile::Commit(struct stat* written) {
+  if (m_fd < 0 || m_committed) return EBADF;
+  Tell();
+  if (::fsync(m_fd) != 0) return errno;
+  Tell();
+  if (written != nullptr && ::fstat(m_fd, written) != 0) return errno;
+  int fd = m_fd;
+  m_fd = -1;
+  if (::close(fd) != 0) return errno;
+  if (::rename(m_temporary.c_str(), m_path.c_str()) != 0) return errno;
+  m_committed = true;
+  Tell();
 
   // Make the rename itself durable; failing to is not worth failing the write.
-  FileDescriptor folder(::open(FolderOf(path).c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+  FileDescriptor folder(::open(FolderOf(m_path).c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
   if (folder.Get() >= 0) ::fsync(folder.Get());
-  tell();
+  Tell();
   return 0;
+}
+
+int ReplaceFileContents(const std::string& path, std::string_view bytes, struct stat* written,
+                        const std::function<void()>& progress) {
+  ReplacementFile file;
+  if (int error = file.Open(path, progress)) return error;
+  if (int error = file.Append(bytes)) return error;
+  return file.Commit(written);
 }
 
 }  // namespace tav

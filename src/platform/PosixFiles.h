@@ -7,6 +7,7 @@
 
 #include <sys/stat.h>
 
+#include <cstdint>
 #include <functional>
 #include <string>
 #include <string_view>
@@ -55,6 +56,37 @@ std::string TemporaryPrefixFor(const std::string& path);
 // many it removed. Called at start for the settings folder and the sequence
 // folder.
 int RemoveStaleTemporaries(const std::string& folder);
+
+// The same replacement for a file written piece by piece: a temporary file
+// beside the file (the end of its chain of links) that takes the bytes, and
+// Commit flushes it and renames it over the file. Given up (destroyed
+// without a successful Commit), the temporary is removed and the file is as
+// it was. Each call returns 0 or the errno of the step that failed.
+// `progress`, when given, is called after every mebibyte appended and after
+// each step of the commit.
+class ReplacementFile {
+ public:
+  ReplacementFile() = default;
+  ~ReplacementFile();
+  ReplacementFile(const ReplacementFile&) = delete;
+  ReplacementFile& operator=(const ReplacementFile&) = delete;
+
+  int Open(const std::string& path, std::function<void()> progress = {});
+  int Append(std::string_view bytes);
+  // Over bytes appended before (a header whose sizes are known at the end).
+  int WriteAt(uint64_t offset, std::string_view bytes);
+  int Commit(struct stat* written = nullptr);
+
+ private:
+  void Tell();
+
+  std::string m_path;
+  std::string m_temporary;
+  int m_fd = -1;
+  bool m_committed = false;
+  std::function<void()> m_progress;
+  size_t m_unreported = 0;
+};
 
 // The folder part of a path: "." for a bare name, "/" for the root.
 std::string FolderOf(const std::string& path);

@@ -16,6 +16,19 @@ DateTime SystemClock::Now() const {
                              local.tm_min, second);
 }
 
+double SystemClock::SecondsSinceMidnight() const {
+  auto now = std::chrono::system_clock::now();
+  std::time_t seconds = std::chrono::system_clock::to_time_t(now);
+  auto fraction = std::chrono::duration_cast<std::chrono::milliseconds>(
+                      now - std::chrono::system_clock::from_time_t(seconds))
+                      .count();
+  if (fraction < 0) fraction = 0;
+  std::tm local{};
+  localtime_r(&seconds, &local);
+  int second = local.tm_sec > 59 ? 59 : local.tm_sec;
+  return local.tm_hour * 3600 + local.tm_min * 60 + second + static_cast<double>(fraction) / 1000.0;
+}
+
 uint32_t SystemClock::TickCount() const {
   auto since = std::chrono::steady_clock::now().time_since_epoch();
   auto ms = std::chrono::duration_cast<std::chrono::milliseconds>(since).count();

@@ -1,7 +1,8 @@
 #pragma once
 // The Clock port on the system's clocks: Now is the local wall-clock time to
 // the whole second (as the platform's Now), from the system time zone with
-// daylight saving applied; TickCount is the monotonic clock in milliseconds,
+// daylight saving applied (SecondsSinceMidnight adds the milliseconds of
+// the present second); TickCount is the monotonic clock in milliseconds,
 // wrapping at 2^32 like the multimedia tick count. Stateless; make one where
 // the program starts and pass it by reference.
 
@@ -12,6 +13,7 @@ namespace tav {
 class SystemClock : public Clock {
  public:
   DateTime Now() const override;
+  double SecondsSinceMidnight() const override;
   uint32_t TickCount() const override;
 };
 

@@ -22,6 +22,19 @@ TEST(SystemClock, NowAgreesWithTheLocalCalendar) {
                                      now.Second()));
 }
 
+TEST(SystemClock, SecondsSinceMidnightIsNowWithItsFraction) {
+  SystemClock clock;
+  double seconds = clock.SecondsSinceMidnight();
+  int whole = clock.Now().SecondOfDay();
+  EXPECT_GE(seconds, 0.0);
+  EXPECT_LT(seconds, 86400.0);
+  // Taken a moment apart; only midnight between the two readings could part them further.
+  double apart = whole - seconds;
+  if (apart < -43200) apart += 86400;
+  EXPECT_GT(apart, -2.0);
+  EXPECT_LT(apart, 2.0);
+}
+
 TEST(SystemClock, TickCountMovesForward) {
   SystemClock clock;
   uint32_t first = clock.TickCount();

@@ -6,6 +6,10 @@
 // A tick that falls due while the program is busy is delivered once, late;
 // missed ticks are not queued up. A tick handler may disable its own timer,
 // change its interval, or enable other timers. Destroying a Timer cancels it.
+//
+// A timer can also be told when its next tick comes (SetNextTickIn): that is
+// how a caller sleeps until the next moment it has work, instead of polling
+// at a short interval, and how it is woken at once when something happens.
 
 #include <cstdint>
 #include <functional>
@@ -23,6 +27,11 @@ class Timer {
   virtual bool Enabled() const = 0;
   virtual void SetEnabled(bool enabled) = 0;
   virtual void SetOnTick(std::function<void()> onTick) = 0;
+  // Moves the next tick to `milliseconds` from now; 0 means as soon as the
+  // program is free (after the handler that is running, if any). Later ticks
+  // follow by the interval as usual; a timer whose interval is 0 ticks only
+  // when asked this way, once per request. Ignored while disabled.
+  virtual void SetNextTickIn(uint32_t milliseconds) = 0;
 };
 
 class TimerService {

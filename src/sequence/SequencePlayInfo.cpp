@@ -293,6 +293,11 @@ void SequencePlayInfo::InitMusicSync(int32_t value) {
   if (m_Sequence) m_Sequence->InitMusicSync(value);
 }
 
+std::optional<int64_t> SequencePlayInfo::MillisecondsUntilDue() {
+  Sequence* held = Held();
+  return held ? held->MillisecondsUntilDue() : std::nullopt;
+}
+
 bool SequencePlayInfo::GetEvent(PlayEvent& event) {
   Sequence* held = Held();
   return held ? held->GetEvent(event) : false;

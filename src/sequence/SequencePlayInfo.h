@@ -89,6 +89,10 @@ class SequencePlayInfo : public SequenceIdentity {
                 int32_t& nIntensityBlobCount, std::vector<uint8_t>& byteIntensityBlob);
   // The whole event, with its due time, for callers that want it at once.
   bool GetEvent(PlayEvent& event);
+  // Milliseconds until GetEvent next has work (0: now); nothing when the
+  // sequence is not playing or nothing is held. The show engine sleeps
+  // until the earliest of these.
+  std::optional<int64_t> MillisecondsUntilDue();
 
   // The media file, resolved, for musical, interactive, startup and shutdown
   // sequences; "" for the other play types and when the load failed. Loads

@@ -442,6 +442,7 @@ TEST_F(PlayInfo, NoPlaybackFileIsAFailureAskedOnceAndHarmlessToPlay) {
   EXPECT_EQ(info.SequencePlayState(), 0);
   PlayEvent event;
   EXPECT_FALSE(info.GetEvent(event));
+  EXPECT_FALSE(info.MillisecondsUntilDue());
   EXPECT_FALSE(info.UsesTAV());
 }
 
@@ -482,8 +483,11 @@ TEST_F(PlayInfo, PlaysEventsThroughTheHeldSequenceAndStopsViaStopping) {
   EXPECT_EQ(circuit, 3);
   EXPECT_EQ(name, "tree");
   EXPECT_THAT(blob, ElementsAre(9, 9));  // untouched: not a level block
+  // The star's effect at 500 is next, 5 ms early.
+  EXPECT_EQ(info->MillisecondsUntilDue(), 495);
 
   info->StopPlay();
+  EXPECT_EQ(info->MillisecondsUntilDue(), 0);
   for (int i = 0; i < 100 && info->SequencePlayState() != 0; ++i) {
     m_clock->AdvanceMilliseconds(10);
     PlayEvent drained;

@@ -1,5 +1,7 @@
 #include <gmock/gmock.h>
 
+#include <filesystem>
+
 #include "ShowctlRunner.h"
 
 namespace tav::showctl::testing {
@@ -59,7 +61,7 @@ TEST_F(ScheduleCommand, BadInputFailsClearlyAndChangesNothing) {
       {{"add", "dated", "X", "18:00", "19:00"}, "needs a date"},
       {{"remove", "weekly", "Tue 10:00"}, "no weekly show runs at Tue 10:00:00"},
       {{"remove", "dated", "2024-12-25 10:00"}, "no dated show runs at 2024-12-25 10:00:00"},
-      {{"at", "someday"}, "is not a date and time"},
+      {{"at", "someday"}, "is neither a date and time"},
   };
   for (const auto& c : cases) {
     SCOPED_TRACE(c.message);
@@ -79,11 +81,21 @@ TEST_F(ScheduleCommand, BadInputFailsClearlyAndChangesNothing) {
   EXPECT_EQ(Read("weeksched.tsc"), overlapping);
 }
 
+// A show file the player reads: five empty playlists.
+const char* kShowFile = "((2,3,1,5,,),(0,1,2,0,,),(2,3,2,5,,),(0,1,2,0,,),(2,3,1,5,,))";
+
 TEST_F(ScheduleCommand, CheckExplainsEachKindOfFile) {
   Write("good.tsc", "((2024-12-24,((252000,2,(, 0,Xmas),237600))))\r\n");
   Result good = Check("good.tsc");
-  EXPECT_EQ(good.exitCode, 0);
+  EXPECT_NE(good.exitCode, 0);
   EXPECT_THAT(good.out, HasSubstr("(year schedule)"));
+  EXPECT_THAT(good.out, HasSubstr("problem: \"Xmas\" does not exist (looked for at " +
+                                  Path("tessavar/Xmas") + ")"));
+  std::filesystem::create_directories(Path("tessavar"));
+  Write("tessavar/Xmas", kShowFile);
+  Result withShow = Check("good.tsc");
+  EXPECT_EQ(withShow.exitCode, 0) << withShow.out;
+  EXPECT_THAT(withShow.out, HasSubstr("\"Xmas\" (" + Path("tessavar/Xmas") + "): OK"));
 
   Write("bad.tsc", "((165600,2,(, 0,A),151200),(12,2))\r\n");
   Result bad = Check("bad.tsc");
@@ -97,6 +109,50 @@ TEST_F(ScheduleCommand, CheckExplainsEachKindOfFile) {
   EXPECT_THAT(show.out, HasSubstr("not a well-formed list"));
 
   EXPECT_THAT(Check("missing.tsc").err, HasSubstr("there is no file"));
+}
+
+TEST_F(ScheduleCommand, AtTakesADayAndTimeAsTheNextSuchMoment) {
+  ASSERT_EQ(Schedule({"add", "weekly", "Xmas", "Mon 18:00", "Mon 22:00"}).exitCode, 0);
+  Result r = Schedule({"at", "Mon 19:00"});
+  ASSERT_EQ(r.exitCode, 0) << r.err;
+  EXPECT_THAT(r.out, HasSubstr("At Monday "));
+  EXPECT_THAT(r.out, HasSubstr(" 19:00:00:"));
+  EXPECT_THAT(r.out, HasSubstr("current  \"Xmas\" from the week schedule"));
+}
+
+TEST_F(ScheduleCommand, MissingShowFilesAreAddedWithAWarningAndCheckedWithTheSchedules) {
+  Result add = Run({"schedule", "add", "weekly", "Later", "Tue 18:00", "Tue 19:00"});
+  ASSERT_EQ(add.exitCode, 0) << add.err;
+  EXPECT_THAT(add.err, HasSubstr("warning: the show file \"Later\" does not exist (looked for at " +
+                                 Path("tessavar/Later") + "); added all the same"));
+  Write("tessavar/Eve", kShowFile);
+  Write("tessavar/Broken", "((2,3,1");
+  ASSERT_EQ(Run({"schedule", "add", "dated", "Eve", "2024-12-24 17:00", "23:00"}).err, "");
+  ASSERT_EQ(Run({"schedule", "add", "dated", "Broken", "2024-12-25 17:00", "23:00"}).exitCode, 0);
+
+  // No file: the usual week and year schedules and every show they name.
+  Result check = Run({"schedule", "check"});
+  EXPECT_NE(check.exitCode, 0);
+  EXPECT_THAT(check.out, HasSubstr(Path("tessavar/weeksched.tsc") + " (week schedule):"));
+  EXPECT_THAT(check.out, HasSubstr(Path("tessavar/yearsched.tsc") + " (year schedule):"));
+  EXPECT_THAT(check.out, HasSubstr("problem: \"Later\" does not exist"));
+  EXPECT_THAT(check.out, HasSubstr("problem: \"Broken\" cannot be run"));
+  EXPECT_THAT(check.out, HasSubstr("\"Eve\" (" + Path("tessavar/Eve") + "): OK"));
+  EXPECT_THAT(check.err, HasSubstr("2 problem(s) in the schedules and their show files"));
+}
+
+TEST_F(ScheduleCommand, ADamagedSettingsFileIsReportedOnce) {
+  Write("registry.reg",
+        "Windows Registry Editor Version 5.00\r\n\r\n"
+        "[HKEY_CURRENT_USER\\Software\\Tessavar\\Shared]\r\n\"X\"=dword:zz\r\n");
+  for (const std::vector<std::string>& args : {std::vector<std::string>{"schedule", "list"},
+                                               {"settings", "list"},
+                                               {"schedule", "check"}}) {
+    Result r = Run(args);
+    size_t first = r.err.find("unreadable dword");
+    ASSERT_NE(first, std::string::npos) << args[0] << " " << args[1] << ": " << r.err;
+    EXPECT_EQ(r.err.find("unreadable dword", first + 1), std::string::npos) << r.err;
+  }
 }
 
 }  // namespace

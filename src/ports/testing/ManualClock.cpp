@@ -15,6 +15,11 @@ DateTime ManualClock::Now() const {
   return m_dateBase.AddSeconds(static_cast<int64_t>(ms / 1000));
 }
 
+double ManualClock::SecondsSinceMidnight() const {
+  uint64_t ms = ElapsedMs() - m_dateBaseElapsed;
+  return Now().SecondOfDay() + static_cast<double>(ms % 1000) / 1000.0;
+}
+
 uint32_t ManualClock::TickCount() const {
   return static_cast<uint32_t>(m_tickBase + (ElapsedMs() - m_tickBaseElapsed));
 }

@@ -26,6 +26,7 @@ class ManualClock : public Clock {
   explicit ManualClock(DateTime now = DateTime::FromParts(2024, 1, 1), uint32_t tickCount = 0);
 
   DateTime Now() const override;
+  double SecondsSinceMidnight() const override;
   uint32_t TickCount() const override;
 
   void SetNow(DateTime now);

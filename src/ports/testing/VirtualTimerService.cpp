@@ -55,6 +55,11 @@ class VirtualTimer : public Timer {
   void SetOnTick(std::function<void()> onTick) override {
     m_onTick = std::make_shared<std::function<void()>>(std::move(onTick));
   }
+  void SetNextTickIn(uint32_t milliseconds) override {
+    if (!m_enabled) return;
+    m_due = m_core->now + milliseconds;
+    m_armOrder = ++m_core->armSequence;
+  }
 
   bool Armed() const { return m_due.has_value(); }
   uint64_t Due() const { return *m_due; }
@@ -63,7 +68,11 @@ class VirtualTimer : public Timer {
   // Called by the service at the tick's moment: schedules the next tick first,
   // so that whatever the handler does (or throws) the timer stays consistent.
   void Fire() {
-    m_due = *m_due + m_interval;
+    if (m_interval > 0) {
+      m_due = *m_due + m_interval;
+    } else {
+      m_due.reset();  // ticks only when asked again
+    }
     m_armOrder = ++m_core->armSequence;
     ++*m_ticksFired;
     // Keep the handler alive even if it destroys its own timer.

@@ -2,7 +2,8 @@
 // Test double for the TimerService port: timers on virtual time. Nothing
 // sleeps; Advance moves the virtual clock forward and fires every tick that
 // falls due on the way, one at a time and in time order (ticks due at the same
-// moment fire in the order their timers were armed). A tick handler may
+// moment fire in the order their timers were armed; SetNextTickIn counts as
+// arming). A tick handler may
 // enable, disable, re-time or destroy any timer, its own included; the change
 // counts from the tick's moment.
 //

@@ -132,6 +132,46 @@ TEST_F(VirtualTimersTest, FireNextTickJumpsToTheNextDueTick) {
   EXPECT_EQ(timers.ArmedTimerNames(), std::vector<std::string>{"t"});
 }
 
+TEST_F(VirtualTimersTest, NextTickCanBeMovedAndLaterTicksFollowByTheInterval) {
+  std::unique_ptr<Timer> t;
+  bool moved = false;
+  t = Make("t", 100, true, [&] {
+    if (!moved) t->SetNextTickIn(250);
+    moved = true;
+  });
+  timers.Advance(700);
+  // The first tick asked for the next one 250 ms later; then every 100 ms.
+  EXPECT_EQ(trace, "t@100 t@350 t@450 t@550 t@650 ");
+}
+
+TEST_F(VirtualTimersTest, NextTickInZeroFiresAtTheSameMomentAfterTheRunningHandler) {
+  std::unique_ptr<Timer> sleeper = Make("sleeper", 1000);
+  sleeper->SetNextTickIn(5000);
+  std::unique_ptr<Timer> waker = Make("waker", 300, true, [&] { sleeper->SetNextTickIn(0); });
+  timers.Advance(300);
+  EXPECT_EQ(trace, "waker@300 sleeper@300 ");
+  // Asked from outside a handler, the tick comes at the present moment.
+  trace.clear();
+  timers.Advance(10);
+  sleeper->SetNextTickIn(0);
+  EXPECT_EQ(timers.NextTickIn(), 0u);
+  timers.Advance(0);
+  EXPECT_EQ(trace, "sleeper@310 ");
+}
+
+TEST_F(VirtualTimersTest, ZeroIntervalTimerTicksOncePerRequestAndDisabledIgnoresRequests) {
+  std::unique_ptr<Timer> oneShot = Make("once", 0);
+  oneShot->SetNextTickIn(40);
+  auto off = Make("off", 0, false);
+  off->SetNextTickIn(10);
+  timers.Advance(1000);
+  EXPECT_EQ(trace, "once@40 ");
+  oneShot->SetNextTickIn(0);
+  timers.Advance(1);
+  EXPECT_EQ(trace, "once@40 once@1000 ");
+  EXPECT_FALSE(timers.NextTickIn());
+}
+
 TEST_F(VirtualTimersTest, TimersMayOutliveTheService) {
   std::unique_ptr<Timer> t;
   {
@@ -152,6 +192,19 @@ TEST(ManualClock, FollowsVirtualTimeInWholeSecondsAndTicksInMilliseconds) {
   EXPECT_EQ(seen, "17:59:59 18:00:01 ");
   EXPECT_EQ(clock.TickCount(), 4'294'967'000u + 3000u);  // wrapped past 2^32
   EXPECT_EQ(clock.TickCount(), 2704u);
+}
+
+TEST(ManualClock, SecondsSinceMidnightCarriesTheMilliseconds) {
+  VirtualTimerService timers;
+  ManualClock clock(DateTime::FromParts(2024, 12, 24, 23, 59, 58));
+  clock.Follow(timers);
+  timers.Advance(1250);
+  EXPECT_DOUBLE_EQ(clock.SecondsSinceMidnight(), 86399.25);
+  EXPECT_EQ(clock.Now().SecondOfDay(), 86399);
+  timers.Advance(750);  // midnight: the clock starts again from 0
+  EXPECT_DOUBLE_EQ(clock.SecondsSinceMidnight(), 0.0);
+  timers.Advance(1);
+  EXPECT_DOUBLE_EQ(clock.SecondsSinceMidnight(), 0.001);
 }
 
 TEST(ManualClock, ReBasingOneClockLeavesTheOtherAlone) {

@@ -3,6 +3,8 @@
 #include <algorithm>
 #include <map>
 
+#include "suite/seqlib/TrackGroup.h"
+
 namespace tav {
 
 bool CompiledSequence::UsesFamily(int32_t family) const {
@@ -15,10 +17,14 @@ bool CompiledSequence::UsesFamily(int32_t family) const {
   return false;
 }
 
-size_t CompiledSequence::FrameCount() const {
-  size_t frames = 0;
-  for (const auto& track : tracks) frames += track.FrameCount();
-  return frames;
+size_t CompiledSequence::TimelineFrameCount() const {
+  return tav::TimelineFrameCount(GroupTracks(tracks));
+}
+
+size_t CompiledSequence::LevelBlockCount() const {
+  size_t blocks = 0;
+  for (const auto& track : tracks) blocks += track.FrameCount();
+  return blocks;
 }
 
 namespace {

@@ -49,7 +49,11 @@ struct CompiledSequence {
   std::vector<LevelTrack> tracks;
 
   bool UsesFamily(int32_t family) const;
-  size_t FrameCount() const;  // over all tracks
+  // Frames of the timeline: moments at which a frame is due, counted once
+  // however many tracks share them.
+  size_t TimelineFrameCount() const;
+  // Level blocks as played: one per track and frame.
+  size_t LevelBlockCount() const;
   friend bool operator==(const CompiledSequence&, const CompiledSequence&) = default;
 };
 

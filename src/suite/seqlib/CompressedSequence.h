@@ -2,8 +2,11 @@
 // The compressed export (<name>.tcs): a compiled sequence as zstd-compressed
 // binary, with the content hash of the file it came from in a small
 // uncompressed header so that "is the export current?" costs one short
-// read. Layout in docs/tcs-format.md. Reading checks every count and
-// length against the bytes present and reports damage as a tav::Error.
+// read. Layout in docs/tcs-format.md. These functions read and write a
+// whole sequence in memory, as the player loads it; CompressedSequenceReader
+// and CompressedSequenceWriter do the same piece by piece. Reading checks
+// every count and length against the bytes present and reports damage as a
+// tav::Error.
 
 #include <cstdint>
 #include <functional>
@@ -26,7 +29,8 @@ std::string WriteCompressedSequence(const CompiledSequence& sequence, int level 
                                     const std::function<void()>& progress = {});
 // `name` is used in error messages only.
 CompiledSequence ReadCompressedSequence(std::string_view bytes, const std::string& name);
-// The source hash from the header; nothing when the bytes are no export.
+// The source hash from the header; nothing when the bytes are no export of
+// the version this program reads (an older export counts as out of date).
 std::optional<uint64_t> ReadCompressedSourceHash(std::string_view header);
 
 }  // namespace tav

@@ -118,6 +118,18 @@ uint64_t CombinedContentHash(uint64_t own, const std::vector<uint64_t>& included
   return hasher.Value();
 }
 
+uint64_t ContentHash(const RandomAccessFile& file) {
+  std::string chunk(64 * 1024, '\0');
+  ContentHasher hasher;
+  for (uint64_t offset = 0; offset < file.Size();) {
+    size_t got = file.ReadAt(offset, chunk.data(), chunk.size());
+    if (got == 0) break;
+    hasher.Update(std::string_view(chunk.data(), got));
+    offset += got;
+  }
+  return hasher.Value();
+}
+
 std::string ContentHashText(uint64_t hash) {
   static const char* digits = "0123456789abcdef";
   std::string text(16, '0');

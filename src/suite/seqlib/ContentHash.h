@@ -16,6 +16,8 @@
 #include <string_view>
 #include <vector>
 
+#include "suite/seqlib/RandomAccessFile.h"
+
 namespace tav {
 
 uint64_t ContentHash(std::string_view bytes);
@@ -41,6 +43,8 @@ class ContentHasher {
 // included files' in the order they were first included.
 uint64_t CombinedContentHash(uint64_t own, const std::vector<uint64_t>& included);
 
+// The same of a whole file, read a piece at a time.
+uint64_t ContentHash(const RandomAccessFile& file);
 // Sixteen lower-case hexadecimal digits.
 std::string ContentHashText(uint64_t hash);
 

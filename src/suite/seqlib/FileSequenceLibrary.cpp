@@ -6,6 +6,7 @@
 
 #include "suite/seqlib/CompiledEventStream.h"
 #include "suite/seqlib/CompressedSequence.h"
+#include "suite/seqlib/CompressedSequenceReader.h"
 #include "suite/seqlib/ContentHash.h"
 #include "suite/seqlib/FseqConversion.h"
 #include "suite/seqlib/FseqEventStream.h"
@@ -142,6 +143,8 @@ struct FileSequenceLibrary::Core {
     for (const auto& range : fseq.Ranges()) channels += range.count;
     info.channelCount = channels;
     info.frameCount = fseq.FrameCount();
+    info.levelBlockCount =
+        static_cast<size_t>(fseq.FrameCount()) * FseqSegments(fseq, universes).size();
     UniverseMap map = universes;
     content->openStream = [file, map] {
       return std::make_unique<FseqEventStream>(std::make_unique<FseqFile>(file), map);
@@ -261,7 +264,8 @@ struct FileSequenceLibrary::Core {
     info.families = FamiliesOf(*compiled);
     info.channelCount = compiled->channels.size();
     info.effectCount = compiled->effects.size();
-    info.frameCount = compiled->FrameCount();
+    info.frameCount = compiled->TimelineFrameCount();
+    info.levelBlockCount = compiled->LevelBlockCount();
     info.sourceHash = compiled->sourceHash;
     content->compiled = compiled;
     content->openStream = [compiled] { return std::make_unique<CompiledEventStream>(compiled); };
@@ -356,6 +360,35 @@ std::shared_ptr<const CompiledSequence> FileSequenceLibrary::LoadCompiled(
     const std::string& path, const std::function<void()>& keepAlive) const {
   LoadContext context{keepAlive, {}, {}};
   return m_core->Read(path, Purpose::kCompile, context)->compiled;
+}
+
+std::string FileSequenceLibrary::FormatOf(const std::string& path) const {
+  switch (m_core->Detect(*m_core->Open(path))) {
+    case Format::Fseq:
+      return "fseq";
+    case Format::Compressed:
+      return "tcs";
+    case Format::Plain:
+    default:
+      return "plain";
+  }
+}
+
+std::unique_ptr<StreamedSequence> FileSequenceLibrary::OpenStreamed(const std::string& path,
+                                                                    bool hashFseq) const {
+  std::shared_ptr<RandomAccessFile> file = m_core->Open(path);
+  switch (m_core->Detect(*file)) {
+    case Format::Fseq: {
+      uint64_t hash = hashFseq ? ContentHash(*file) : 0;
+      return std::make_unique<FseqStreamedSequence>(std::make_unique<FseqFile>(file),
+                                                    m_core->universes, hash);
+    }
+    case Format::Compressed:
+      return std::make_unique<CompressedSequenceReader>(file);
+    case Format::Plain:
+    default:
+      return std::make_unique<CompiledStreamedSequence>(LoadCompiled(path));
+  }
 }
 
 }  // namespace tav

@@ -25,6 +25,7 @@
 #include "suite/seqlib/PathResolver.h"
 #include "suite/seqlib/SequenceData.h"
 #include "suite/seqlib/SequenceLibrary.h"
+#include "suite/seqlib/StreamedSequence.h"
 #include "suite/seqlib/UniverseMap.h"
 
 namespace tav {
@@ -53,6 +54,16 @@ class FileSequenceLibrary : public SequenceLibrary {
   // Any sequence file in the compiled form (an FSEQ file read whole).
   std::shared_ptr<const CompiledSequence> LoadCompiled(
       const std::string& path, const std::function<void()>& keepAlive = {}) const;
+
+  // "plain", "fseq" or "tcs", judged by the content. Throws tav::Error for
+  // a missing file or one of no known format.
+  std::string FormatOf(const std::string& path) const;
+  // Any sequence file as a stream of frames: an export or an FSEQ file is
+  // read a block at a time (opening reads its headers only); a plain
+  // sequence is compiled in memory first. An FSEQ file's source hash is
+  // left 0 unless `hashFseq`, which reads the whole file once more.
+  std::unique_ptr<StreamedSequence> OpenStreamed(const std::string& path,
+                                                 bool hashFseq = false) const;
 
   struct Core;
 

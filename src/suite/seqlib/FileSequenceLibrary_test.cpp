@@ -7,6 +7,7 @@
 
 #include "platform/LocalFileSystem.h"
 #include "ports/testing/ManualClock.h"
+#include "suite/seqlib/CompressedSequenceWriter.h"
 #include "suite/seqlib/FseqWriter.h"
 #include "suite/seqlib/PlainSequence.h"
 #include "suite/seqlib/SeqErrors.h"
@@ -86,6 +87,34 @@ TEST_F(Library, LoadsAPlainSequenceWithItsSubsequence) {
   EXPECT_EQ(events[2].lCircuit, 4);
   EXPECT_EQ(events[1].byteIntensityBlob, (std::vector<uint8_t>{1, 2}));
   EXPECT_EQ(events[1].nIntensityBlobStartAddress, 5);
+}
+
+TEST_F(Library, EveryFormatOpensAsAStreamOfTheSameFrames) {
+  std::string plain = dir.Write("show/main.tseq", kMain);
+  dir.Write("Sequences/intro.tseq", kIntro);
+  std::string fseq = TestDataFile("v2_sparse.fseq");
+  struct {
+    std::string path;
+    const char* format;
+  } files[] = {{plain, "plain"}, {fseq, "fseq"}};
+  for (const auto& f : files) {
+    EXPECT_EQ(library.FormatOf(f.path), f.format);
+    // Written as an export by streaming, then read back as one.
+    auto out = fs->OpenForWrite(dir / "copy.tcs");
+    auto source = library.OpenStreamed(f.path, true);
+    WriteCompressedSequence(*source, *out);
+    out->Commit();
+    EXPECT_EQ(library.FormatOf(dir / "copy.tcs"), "tcs");
+    auto whole = library.LoadCompiled(f.path);
+    CompiledSequence copy = ReadWhole(*library.OpenStreamed(dir / "copy.tcs"));
+    EXPECT_EQ(copy.tracks, whole->tracks) << f.path;
+    EXPECT_EQ(copy.effects, whole->effects) << f.path;
+    EXPECT_EQ(copy.sourceHash, whole->sourceHash) << f.path;
+  }
+  // Without asking, an FSEQ file is not read through for its hash.
+  EXPECT_EQ(library.OpenStreamed(fseq)->Head().sourceHash, 0u);
+  EXPECT_EQ(library.LoadContent(fseq)->info.frameCount, 120u);
+  EXPECT_EQ(library.LoadContent(fseq)->info.levelBlockCount, 360u);
 }
 
 TEST_F(Library, SubsequenceBesideTheIncludingFileWins) {

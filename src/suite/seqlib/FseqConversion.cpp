@@ -1,5 +1,7 @@
 #include "suite/seqlib/FseqConversion.h"
 
+#include <cstring>
+
 #include "suite/seqlib/FseqEventStream.h"
 #include "suite/seqlib/PlayEvent.h"
 
@@ -30,6 +32,40 @@ SequenceData FseqToSequenceData(FseqFile& file, const UniverseMap& map,
     if (keepAlive && f % 64 == 0) keepAlive();
   }
   return data;
+}
+
+FseqStreamedSequence::FseqStreamedSequence(std::unique_ptr<FseqFile> file, const UniverseMap& map,
+                                           uint64_t sourceHash)
+    : m_file(std::move(file)), m_segments(FseqSegments(*m_file, map)) {
+  m_head.lengthMs = static_cast<int64_t>(m_file->DurationMs());
+  m_head.media = m_file->MediaFilename();
+  m_head.sourceHash = sourceHash;
+  if (m_segments.empty()) return;
+  TrackGroup group;
+  group.stepMs = static_cast<int32_t>(m_file->StepMs());
+  group.frameCount = m_file->FrameCount();
+  for (const auto& segment : m_segments) {
+    group.tracks.push_back({kFamilyDMX,
+                            segment.universe,
+                            0,
+                            segment.firstSlot,
+                            static_cast<int32_t>(segment.count),
+                            0,
+                            group.stepMs,
+                            {}});
+  }
+  m_groups.push_back(std::move(group));
+}
+
+const uint8_t* FseqStreamedSequence::ReadFrame(size_t, uint32_t frame) {
+  const uint8_t* stored = m_file->Frame(frame);
+  m_frame.resize(m_groups[0].FrameBytes());
+  uint8_t* out = m_frame.data();
+  for (const auto& segment : m_segments) {
+    std::memcpy(out, stored + segment.storedOffset, segment.count);
+    out += segment.count;
+  }
+  return m_frame.data();
 }
 
 }  // namespace tav

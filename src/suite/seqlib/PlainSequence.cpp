@@ -5,7 +5,9 @@
 #include <algorithm>
 #include <cctype>
 #include <cmath>
+#include <cstring>
 
+#include "suite/seqlib/PlainSequenceWriter.h"
 #include "suite/seqlib/PlayEvent.h"
 #include "suite/seqlib/SeqErrors.h"
 
@@ -208,65 +210,92 @@ uint8_t HexDigit(const Walker& w, char c, const std::string& path) {
   w.Fail(path, std::string("'") + c + "' is not a hexadecimal digit");
 }
 
-LevelTrack ReadTrack(const Walker& w, const json& t, const std::string& path) {
-  w.ObjectAt(t, path);
+// One run of addresses: the "dmx" or "tav" object of a frame entry.
+LevelTrack ReadTrackAddress(const Walker& w, const json& a, int32_t family, const std::string& p) {
+  w.ObjectAt(a, p);
   LevelTrack track;
-  const json* dmx = w.Optional(t, "dmx");
-  const json* tav = w.Optional(t, "tav");
-  if ((dmx != nullptr) == (tav != nullptr)) w.Fail(path, "give exactly one of \"dmx\" or \"tav\"");
-  if (dmx) {
-    std::string p = path + ".dmx";
-    w.ObjectAt(*dmx, p);
-    track.family = kFamilyDMX;
-    track.network = static_cast<int32_t>(w.IntegerMember(*dmx, p, "universe", 1, 63999));
-    track.firstAddress = static_cast<int32_t>(w.IntegerMember(*dmx, p, "first_slot", 1, 512));
-    track.count = static_cast<int32_t>(w.IntegerMember(*dmx, p, "count", 1, 512));
+  track.family = family;
+  if (family == kFamilyDMX) {
+    track.network = static_cast<int32_t>(w.IntegerMember(a, p, "universe", 1, 63999));
+    track.firstAddress = static_cast<int32_t>(w.IntegerMember(a, p, "first_slot", 1, 512));
+    track.count = static_cast<int32_t>(w.IntegerMember(a, p, "count", 1, 512));
     if (track.firstAddress + track.count - 1 > 512) {
       w.Fail(p, "slots " + std::to_string(track.firstAddress) + " to " +
                     std::to_string(track.firstAddress + track.count - 1) + " run past slot 512");
     }
   } else {
-    std::string p = path + ".tav";
-    w.ObjectAt(*tav, p);
-    track.family = kFamilyTAV;
-    track.network = static_cast<int32_t>(w.IntegerMember(*tav, p, "network", 1, kMaxInt));
-    track.unit = static_cast<int32_t>(w.IntegerMember(*tav, p, "unit", 0, 255));
-    track.firstAddress =
-        static_cast<int32_t>(w.IntegerMember(*tav, p, "first_circuit", 1, kMaxInt));
-    track.count = static_cast<int32_t>(w.IntegerMember(*tav, p, "count", 1, 4096));
-  }
-  track.startMs = w.IntegerOr(t, path, "start_ms", 0, kMaxTime, 0);
-  track.stepMs = static_cast<int32_t>(w.IntegerMember(t, path, "step_ms", 1, 60000));
-  const json& levels = w.ArrayAt(w.Member(t, path, "levels"), path + ".levels");
-  track.levels.reserve(levels.size() * static_cast<size_t>(track.count));
-  for (size_t k = 0; k < levels.size(); ++k) {
-    std::string p = path + ".levels[" + std::to_string(k) + "]";
-    const json& frame = levels[k];
-    if (frame.is_string()) {
-      const std::string& hex = frame.get_ref<const std::string&>();
-      if (hex.size() != static_cast<size_t>(track.count) * 2) {
-        w.Fail(p, "holds " + std::to_string(hex.size()) + " hexadecimal digits, " +
-                      std::to_string(track.count * 2) + " expected (two per level)");
-      }
-      for (size_t i = 0; i < hex.size(); i += 2) {
-        track.levels.push_back(
-            static_cast<uint8_t>(HexDigit(w, hex[i], p) << 4 | HexDigit(w, hex[i + 1], p)));
-      }
-    } else if (frame.is_array()) {
-      if (frame.size() != static_cast<size_t>(track.count)) {
-        w.Fail(p, "holds " + std::to_string(frame.size()) + " levels, " +
-                      std::to_string(track.count) + " expected");
-      }
-      for (size_t i = 0; i < frame.size(); ++i) {
-        track.levels.push_back(
-            static_cast<uint8_t>(w.Integer(frame[i], p + "[" + std::to_string(i) + "]", 0, 255)));
-      }
-    } else {
-      w.Fail(p,
-             "expected a hexadecimal text or a list of levels, found " + Walker::Describe(frame));
-    }
+    track.network = static_cast<int32_t>(w.IntegerMember(a, p, "network", 1, kMaxInt));
+    track.unit = static_cast<int32_t>(w.IntegerMember(a, p, "unit", 0, 255));
+    track.firstAddress = static_cast<int32_t>(w.IntegerMember(a, p, "first_circuit", 1, kMaxInt));
+    track.count = static_cast<int32_t>(w.IntegerMember(a, p, "count", 1, 4096));
   }
   return track;
+}
+
+// A frame entry: one run of addresses, or a list of runs whose levels lie
+// back to back in every frame (as a converter writes many universes that
+// share their frames). Gives one track per run.
+std::vector<LevelTrack> ReadTracks(const Walker& w, const json& t, const std::string& path) {
+  w.ObjectAt(t, path);
+  const json* dmx = w.Optional(t, "dmx");
+  const json* tav = w.Optional(t, "tav");
+  if ((dmx != nullptr) == (tav != nullptr)) w.Fail(path, "give exactly one of \"dmx\" or \"tav\"");
+  int32_t family = dmx ? kFamilyDMX : kFamilyTAV;
+  const json& runs = dmx ? *dmx : *tav;
+  std::string p = path + (dmx ? ".dmx" : ".tav");
+  std::vector<LevelTrack> tracks;
+  if (runs.is_array()) {
+    if (runs.empty()) w.Fail(p, "empty list of address runs");
+    for (size_t i = 0; i < runs.size(); ++i) {
+      tracks.push_back(ReadTrackAddress(w, runs[i], family, p + "[" + std::to_string(i) + "]"));
+    }
+  } else {
+    tracks.push_back(ReadTrackAddress(w, runs, family, p));
+  }
+  int64_t startMs = w.IntegerOr(t, path, "start_ms", 0, kMaxTime, 0);
+  auto stepMs = static_cast<int32_t>(w.IntegerMember(t, path, "step_ms", 1, 60000));
+  size_t total = 0;
+  for (auto& track : tracks) {
+    track.startMs = startMs;
+    track.stepMs = stepMs;
+    total += static_cast<size_t>(track.count);
+  }
+  const json& levels = w.ArrayAt(w.Member(t, path, "levels"), path + ".levels");
+  for (auto& track : tracks) track.levels.reserve(levels.size() * static_cast<size_t>(track.count));
+  std::vector<uint8_t> frame(total);
+  for (size_t k = 0; k < levels.size(); ++k) {
+    std::string lp = path + ".levels[" + std::to_string(k) + "]";
+    const json& entry = levels[k];
+    if (entry.is_string()) {
+      const std::string& hex = entry.get_ref<const std::string&>();
+      if (hex.size() != total * 2) {
+        w.Fail(lp, "holds " + std::to_string(hex.size()) + " hexadecimal digits, " +
+                       std::to_string(total * 2) + " expected (two per level)");
+      }
+      for (size_t i = 0; i < total; ++i) {
+        frame[i] = static_cast<uint8_t>(HexDigit(w, hex[2 * i], lp) << 4 |
+                                        HexDigit(w, hex[2 * i + 1], lp));
+      }
+    } else if (entry.is_array()) {
+      if (entry.size() != total) {
+        w.Fail(lp, "holds " + std::to_string(entry.size()) + " levels, " + std::to_string(total) +
+                       " expected");
+      }
+      for (size_t i = 0; i < total; ++i) {
+        frame[i] =
+            static_cast<uint8_t>(w.Integer(entry[i], lp + "[" + std::to_string(i) + "]", 0, 255));
+      }
+    } else {
+      w.Fail(lp,
+             "expected a hexadecimal text or a list of levels, found " + Walker::Describe(entry));
+    }
+    const uint8_t* from = frame.data();
+    for (auto& track : tracks) {
+      track.levels.insert(track.levels.end(), from, from + track.count);
+      from += track.count;
+    }
+  }
+  return tracks;
 }
 
 std::string PositionOf(std::string_view text, size_t byte) {
@@ -355,7 +384,9 @@ SequenceData ParsePlainSequence(std::string_view text, const std::string& name,
   if (const json* frames = w.Optional(doc, "frames")) {
     w.ArrayAt(*frames, "frames");
     for (size_t i = 0; i < frames->size(); ++i) {
-      data.tracks.push_back(ReadTrack(w, (*frames)[i], "frames[" + std::to_string(i) + "]"));
+      for (auto& track : ReadTracks(w, (*frames)[i], "frames[" + std::to_string(i) + "]")) {
+        data.tracks.push_back(std::move(track));
+      }
     }
   }
   if (const json* subs = w.Optional(doc, "subsequences")) {
@@ -373,105 +404,29 @@ SequenceData ParsePlainSequence(std::string_view text, const std::string& name,
   return data;
 }
 
-namespace {
-
-using nlohmann::ordered_json;
-
-ordered_json AddressJson(const ChannelAddress& a) {
-  switch (a.family) {
-    case kFamilyTAV:
-      return {{"network", a.network}, {"unit", a.unit}, {"circuit", a.circuit}};
-    case kFamilyX10:
-      return {{"house", std::string(1, static_cast<char>('A' + a.network - 1))},
-              {"unit", a.circuit}};
-    case kFamilyFennick:
-      return {{"network", a.network}, {"channel", a.circuit}};
-    default:
-      return {{"universe", a.network}, {"slot", a.circuit}};
-  }
-}
-
-const char* FamilyKey(int32_t family) {
-  switch (family) {
-    case kFamilyTAV:
-      return "tav";
-    case kFamilyX10:
-      return "x10";
-    case kFamilyFennick:
-      return "fennick";
-    default:
-      return "dmx";
-  }
-}
-
-std::string Hex(const uint8_t* p, size_t n) {
-  static const char* digits = "0123456789abcdef";
-  std::string s(n * 2, '0');
-  for (size_t i = 0; i < n; ++i) {
-    s[2 * i] = digits[p[i] >> 4];
-    s[2 * i + 1] = digits[p[i] & 15];
-  }
-  return s;
-}
-
-}  // namespace
-
 std::string WritePlainSequence(const SequenceData& data) {
-  ordered_json doc = ordered_json::object();
-  doc["tessavar_sequence"] = kPlainSequenceVersion;
-  if (data.lengthMs > 0) doc["length_ms"] = data.lengthMs;
-  if (!data.media.empty()) doc["media"] = data.media;
-  if (!data.shellCommand.empty()) doc["shell_command"] = data.shellCommand;
-  ordered_json channels = ordered_json::array();
-  for (const auto& channel : data.channels) {
-    ordered_json c = ordered_json::object();
-    if (!channel.name.empty()) c["name"] = channel.name;
-    c[FamilyKey(channel.address.family)] = AddressJson(channel.address);
-    ordered_json effects = ordered_json::array();
-    for (const auto& e : channel.effects) {
-      ordered_json j = {{"at", e.atMs}, {"type", EffectTypeName(e.type)}};
-      if (e.durationMs != 0) j["duration"] = e.durationMs;
-      if (e.type == kEffectSet) {
-        j["level"] = e.endIntensity;
-      } else if (e.type != kEffectOff) {
-        j["from"] = e.startIntensity;
-        j["to"] = e.endIntensity;
+  MemoryWritableFile out;
+  SequenceData head = data;
+  head.tracks.clear();
+  PlainSequenceWriter writer(out, head, GroupTracks(data.tracks));
+  std::vector<uint8_t> frame;
+  size_t first = 0;
+  for (const auto& group : writer.Groups()) {
+    frame.resize(group.FrameBytes());
+    for (uint32_t k = 0; k < group.frameCount; ++k) {
+      uint8_t* to = frame.data();
+      for (size_t t = 0; t < group.tracks.size(); ++t) {
+        const LevelTrack& track = data.tracks[first + t];
+        size_t count = static_cast<size_t>(track.count);
+        std::memcpy(to, track.levels.data() + k * count, count);
+        to += count;
       }
-      if (e.priority != 0) j["priority"] = e.priority;
-      effects.push_back(std::move(j));
+      writer.AddFrame(frame.data());
     }
-    c["effects"] = std::move(effects);
-    channels.push_back(std::move(c));
+    first += group.tracks.size();
   }
-  if (!channels.empty()) doc["channels"] = std::move(channels);
-  ordered_json frames = ordered_json::array();
-  for (const auto& track : data.tracks) {
-    ordered_json t = ordered_json::object();
-    if (track.family == kFamilyTAV) {
-      t["tav"] = {{"network", track.network},
-                  {"unit", track.unit},
-                  {"first_circuit", track.firstAddress},
-                  {"count", track.count}};
-    } else {
-      t["dmx"] = {
-          {"universe", track.network}, {"first_slot", track.firstAddress}, {"count", track.count}};
-    }
-    t["start_ms"] = track.startMs;
-    t["step_ms"] = track.stepMs;
-    ordered_json levels = ordered_json::array();
-    for (size_t k = 0; k < track.FrameCount(); ++k) {
-      levels.push_back(Hex(&track.levels[k * static_cast<size_t>(track.count)],
-                           static_cast<size_t>(track.count)));
-    }
-    t["levels"] = std::move(levels);
-    frames.push_back(std::move(t));
-  }
-  if (!frames.empty()) doc["frames"] = std::move(frames);
-  ordered_json subs = ordered_json::array();
-  for (const auto& s : data.subsequences)
-    subs.push_back({{"file", s.file}, {"offset_ms", s.offsetMs}});
-  if (!subs.empty()) doc["subsequences"] = std::move(subs);
-  return doc.dump(1) + "\n";
+  writer.Finish();
+  return std::move(out.Bytes());
 }
 
 }  // namespace tav

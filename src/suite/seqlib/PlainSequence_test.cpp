@@ -109,6 +109,39 @@ TEST(PlainSequence, BadFilesSayWhatAndWhere) {
   }
 }
 
+TEST(PlainSequence, AListOfAddressRunsSharesEachFrame) {
+  SequenceData data = ParsePlainSequence(R"({"tessavar_sequence": 1, "frames": [
+    {"dmx": [{"universe": 1, "first_slot": 511, "count": 2}, {"universe": 2, "first_slot": 1,
+              "count": 1}],
+     "start_ms": 40, "step_ms": 20, "levels": ["010203", [4, 5, 6]]}]})",
+                                         "g.tseq");
+  ASSERT_EQ(data.tracks.size(), 2u);
+  EXPECT_EQ(data.tracks[0], (LevelTrack{kFamilyDMX, 1, 0, 511, 2, 40, 20, {1, 2, 4, 5}}));
+  EXPECT_EQ(data.tracks[1], (LevelTrack{kFamilyDMX, 2, 0, 1, 1, 40, 20, {3, 6}}));
+  // Written back, neighbours of one timing become one entry again.
+  std::string text = WritePlainSequence(data);
+  EXPECT_NE(text.find("\"dmx\": [{\"universe\":1,"), std::string::npos) << text;
+  EXPECT_EQ(ParsePlainSequence(text, "again"), data);
+
+  for (const auto& [bad, words] : std::vector<std::pair<std::string, std::string>>{
+           {R"({"tessavar_sequence": 1, "frames": [{"dmx": [], "step_ms": 5, "levels": []}]})",
+            "frames[0].dmx: empty list of address runs"},
+           {R"({"tessavar_sequence": 1, "frames": [{"tav": [{"network": 1, "unit": 1,
+               "first_circuit": 1, "count": 2}, {"network": 1}], "step_ms": 5, "levels": []}]})",
+            "frames[0].tav[1]: missing \"unit\""},
+           {R"({"tessavar_sequence": 1, "frames": [{"dmx": [{"universe": 1, "first_slot": 1,
+               "count": 2}, {"universe": 2, "first_slot": 1, "count": 1}], "step_ms": 5,
+               "levels": ["0102"]}]})",
+            "frames[0].levels[0]: holds 4 hexadecimal digits, 6 expected"}}) {
+    try {
+      ParsePlainSequence(bad, "g.tseq");
+      ADD_FAILURE() << "accepted: " << bad;
+    } catch (const Error& e) {
+      EXPECT_NE(e.Description().find(words), std::string::npos) << e.Description();
+    }
+  }
+}
+
 TEST(PlainSequence, RecognisedByContentNotName) {
   EXPECT_TRUE(LooksLikePlainSequence("\xEF\xBB\xBF  \n{\"tessavar_sequence\": 1}"));
   EXPECT_FALSE(LooksLikePlainSequence("PSEQ"));

@@ -18,11 +18,23 @@ void ReadExactly(const RandomAccessFile& file, uint64_t offset, void* buffer, si
   }
 }
 
-size_t MemoryFile::ReadAt(uint64_t offset, void* buffer, size_t count) const {
-  if (offset >= m_bytes.size()) return 0;
-  size_t n = std::min<uint64_t>(count, m_bytes.size() - offset);
-  std::memcpy(buffer, m_bytes.data() + offset, n);
+namespace {
+
+size_t CopyOut(std::string_view bytes, uint64_t offset, void* buffer, size_t count) {
+  if (offset >= bytes.size()) return 0;
+  size_t n = std::min<uint64_t>(count, bytes.size() - offset);
+  std::memcpy(buffer, bytes.data() + offset, n);
   return n;
+}
+
+}  // namespace
+
+size_t MemoryFile::ReadAt(uint64_t offset, void* buffer, size_t count) const {
+  return CopyOut(m_bytes, offset, buffer, count);
+}
+
+size_t MemoryView::ReadAt(uint64_t offset, void* buffer, size_t count) const {
+  return CopyOut(m_bytes, offset, buffer, count);
 }
 
 }  // namespace tav

@@ -1,11 +1,13 @@
 #pragma once
 // A file read at arbitrary offsets, so readers of large files (FSEQ) fetch
 // only the part they need. MemoryFile serves bytes already in memory: the
-// fuzz targets, tests that build damaged files, and small files read whole.
+// fuzz targets, tests that build damaged files, and small files read whole;
+// MemoryView serves bytes someone else holds.
 
 #include <cstddef>
 #include <cstdint>
 #include <string>
+#include <string_view>
 
 namespace tav {
 
@@ -35,6 +37,19 @@ class MemoryFile : public RandomAccessFile {
 
  private:
   std::string m_bytes;
+  std::string m_name;
+};
+
+// Bytes owned elsewhere, which must outlive the view.
+class MemoryView : public RandomAccessFile {
+ public:
+  MemoryView(std::string_view bytes, std::string name) : m_bytes(bytes), m_name(std::move(name)) {}
+  uint64_t Size() const override { return m_bytes.size(); }
+  size_t ReadAt(uint64_t offset, void* buffer, size_t count) const override;
+  const std::string& Name() const override { return m_name; }
+
+ private:
+  std::string_view m_bytes;
   std::string m_name;
 };
 

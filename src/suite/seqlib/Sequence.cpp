@@ -111,6 +111,9 @@ void Sequence::SyncToMusic(int32_t positionMs) {
 bool Sequence::GetEvent(PlayEvent& event) {
   return m_player ? m_player->GetEvent(event) : false;
 }
+std::optional<int64_t> Sequence::MillisecondsUntilDue() {
+  return m_player ? m_player->MillisecondsUntilDue() : std::nullopt;
+}
 int64_t Sequence::Position() const {
   return m_player ? m_player->Position() : 0;
 }

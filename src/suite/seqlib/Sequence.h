@@ -11,6 +11,7 @@
 #include <cstdint>
 #include <functional>
 #include <memory>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -33,7 +34,8 @@ struct SequenceInfo {
   std::vector<int32_t> families;  // in ascending order
   size_t channelCount = 0;        // effect channels, or FSEQ channels
   size_t effectCount = 0;
-  size_t frameCount = 0;  // FSEQ frames, or frames over all tracks
+  size_t frameCount = 0;       // frames of the timeline
+  size_t levelBlockCount = 0;  // level blocks over all tracks and frames
   uint64_t sourceHash = 0;
 };
 
@@ -93,6 +95,8 @@ class Sequence {
   void InitMusicSync(int32_t positionMs);
   void SyncToMusic(int32_t positionMs);
   bool GetEvent(PlayEvent& event);
+  // SequencePlayer::MillisecondsUntilDue; nothing before a load.
+  std::optional<int64_t> MillisecondsUntilDue();
   int64_t Position() const;
 
   // Completes a command the shell-command manager prepared: it runs in the

@@ -87,6 +87,32 @@ void SequencePlayer::SyncToMusic(int32_t positionMs) {
   m_basePosition = positionMs;
 }
 
+std::optional<int64_t> SequencePlayer::MillisecondsUntilDue() {
+  if (m_state == kStateStopped) return std::nullopt;
+  if (m_state == kStateStopping) return 0;
+  const int64_t position = Position();
+  const int64_t next = m_stream->NextTime();
+  // The position GetEvent waits for: the next event less the lookahead, or
+  // the end of the timeline once the events are exhausted.
+  int64_t target;
+  if (next != EventStream::kEnd) {
+    target = next - m_lookahead;
+  } else if (position < m_length) {
+    target = m_length;
+  } else {
+    return 0;
+  }
+  int64_t wait = target - position;
+  if (wait <= 0) return 0;
+  if (m_musicMode && !m_musicSynced) {
+    // Held at the start while waiting for the music (see Position): the
+    // timeline only moves once the wait is over.
+    int64_t elapsed = static_cast<uint32_t>(m_clock->TickCount() - m_baseTick);
+    if (elapsed < kMusicWaitMs) wait += kMusicWaitMs - elapsed;
+  }
+  return wait;
+}
+
 bool SequencePlayer::GetEvent(PlayEvent& event) {
   if (m_state == kStateStopped) return false;
   uint32_t now = m_clock->TickCount();

@@ -11,6 +11,7 @@
 
 #include <cstdint>
 #include <memory>
+#include <optional>
 #include <vector>
 
 #include "ports/Clock.h"
@@ -57,6 +58,12 @@ class SequencePlayer {
 
   // The next due event; false when none is due yet or play has ended.
   bool GetEvent(PlayEvent& event);
+  // Milliseconds from now until GetEvent next has something to do (an event
+  // within the lookahead, the end of the timeline, the lights-off of a
+  // stop), on the present timeline: 0 when that is now, nothing when the
+  // sequence is stopped. Lets a caller sleep until then instead of polling;
+  // a music position fed later may move the moment.
+  std::optional<int64_t> MillisecondsUntilDue();
 
   // Where the timeline stands now, in milliseconds.
   int64_t Position() const;

@@ -235,6 +235,68 @@ TEST_F(Playback, LookaheadIsAdjustable) {
   EXPECT_EQ(Drain().size(), 1u);  // the frame at 50
 }
 
+// The due-time query must name exactly the moments at which GetEvent has
+// something to do: walking the clock one millisecond at a time, nothing
+// happens while it says "later", and something does when it says "now".
+class DueTime : public Playback {
+ protected:
+  // Walks `ms` milliseconds; returns how many moments had work.
+  int Walk(int ms) {
+    int busy = 0;
+    for (int t = 0; t < ms; ++t) {
+      std::optional<int64_t> due = sequence->MillisecondsUntilDue();
+      int32_t stateBefore = sequence->SequencePlayState();
+      bool happened = !Drain().empty() || sequence->SequencePlayState() != stateBefore;
+      if (!due) {
+        EXPECT_EQ(stateBefore, SequencePlayer::kStateStopped) << "at +" << t;
+        EXPECT_FALSE(happened) << "at +" << t;
+      } else {
+        EXPECT_EQ(happened, *due == 0) << "at +" << t << " due in " << *due;
+      }
+      busy += happened;
+      Advance(1);
+    }
+    return busy;
+  }
+};
+
+TEST_F(DueTime, NamesEveryEventAndTheEnd) {
+  sequence->SetLightsOffAtEnd(true);
+  sequence->StartPlay();
+  // 7 moments with events (0, 45, 95, 145, 245, 345, 395) and the end at 500.
+  EXPECT_EQ(Walk(600), 8);
+  EXPECT_FALSE(sequence->MillisecondsUntilDue());
+}
+
+TEST_F(DueTime, FollowsLoopsAndStops) {
+  sequence->SetLoopAtEnd(true);
+  sequence->StartPlay();
+  EXPECT_EQ(Walk(1200), 8 + 7 + 3);  // two rounds and the start of a third
+  sequence->StopPlay();
+  EXPECT_EQ(sequence->MillisecondsUntilDue(), 0);
+  EXPECT_EQ(Walk(10), 1);
+}
+
+TEST_F(DueTime, CountsTheWaitForTheMusic) {
+  sequence->InitializeForPlay(true);
+  sequence->StartPlay();
+  Drain();
+  EXPECT_EQ(sequence->MillisecondsUntilDue(), SequencePlayer::kMusicWaitMs + 45);
+  EXPECT_EQ(Walk(SequencePlayer::kMusicWaitMs + 100), 2);
+  // Once the music reports, the timeline is the music's.
+  sequence->SyncToMusic(300);
+  EXPECT_EQ(Drain().size(), 2u);  // the rest of the fade and the frame at 300
+  EXPECT_EQ(sequence->MillisecondsUntilDue(), 45);
+}
+
+TEST_F(DueTime, NothingIsDueBeforeALoadOrAfterTheEnd) {
+  auto unloaded = library.CreateSequence();
+  EXPECT_FALSE(unloaded->MillisecondsUntilDue());
+  sequence->StartPlay();
+  sequence->ForceStop();
+  EXPECT_FALSE(sequence->MillisecondsUntilDue());
+}
+
 TEST(Sequence, DoesNothingBeforeALoad) {
   auto clock = std::make_shared<ManualClock>();
   Sequence sequence(clock, nullptr);

@@ -30,9 +30,11 @@ void RecordingChannelIO::Record(const std::string& method, std::string text, uin
     Failure f = failure->second;
     m_failNext.erase(failure);
     m_calls.push_back({method, std::move(text) + " failed", dueTick});
+    if (m_onCall) m_onCall(m_calls.back());
     throw Error(f.number, "RecordingChannelIO." + method, f.description);
   }
   m_calls.push_back({method, std::move(text), dueTick});
+  if (m_onCall) m_onCall(m_calls.back());
 }
 
 void RecordingChannelIO::SetupClient(bool boolExclusive, const std::string& szClientName,

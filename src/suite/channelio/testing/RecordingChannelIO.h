@@ -61,6 +61,9 @@ class RecordingChannelIO : public ChannelIO {
   // Leaves out the level blocks and SendAccumulated from the call record
   // (their levels are still kept), for tests that compare the rest.
   void SetRecordLevels(bool record) { m_recordLevels = record; }
+  // Called with every call as it is recorded, so a test can interleave the
+  // control's calls with other records of its own (a timeline of a show).
+  void SetOnCall(std::function<void(const Call&)> observer) { m_onCall = std::move(observer); }
 
   // The level of a DMX slot (1-based) or TAV circuit as last sent; 0 when
   // never sent.
@@ -84,6 +87,7 @@ class RecordingChannelIO : public ChannelIO {
   std::map<std::tuple<int32_t, int32_t>, std::vector<uint8_t>> m_tav;
   std::vector<ChannelInputEvent> m_inputs;
   std::function<void(const ChannelInputEvent&)> m_onInput;
+  std::function<void(const Call&)> m_onCall;
   struct Failure {
     int32_t number;
     std::string description;

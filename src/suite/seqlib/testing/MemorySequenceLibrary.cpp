@@ -31,7 +31,8 @@ struct MemorySequenceLibrary::State {
     }
     content->info.channelCount = c->channels.size();
     content->info.effectCount = c->effects.size();
-    content->info.frameCount = c->FrameCount();
+    content->info.frameCount = c->TimelineFrameCount();
+    content->info.levelBlockCount = c->LevelBlockCount();
     content->compiled = c;
     content->openStream = [c] { return std::make_unique<CompiledEventStream>(c); };
     auto exported = entry.exported;
