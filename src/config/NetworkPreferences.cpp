@@ -35,8 +35,10 @@ std::string Lower(std::string text) {
   return text;
 }
 
-// Reads one section's values, turning an unreadable value into its default
-// and a line in `problems`.
+// Reads one section's values, turning an unreadable value (of another type,
+// or a number out of range) into its default and a line in `problems`. A
+// store that cannot be read at all is raised instead: defaults standing in
+// for a whole configuration would reconfigure every network.
 class SectionReader {
  public:
   SectionReader(RegistryStore& store, std::string section, std::vector<std::string>& problems)
@@ -75,6 +77,9 @@ class SectionReader {
  private:
   std::string Where(const char* name) const { return "Shared\\" + m_section + "\\" + name; }
   void Problem(const char* name, const Error& error, const std::string& used) const {
+    bool badValue =
+        error.Number() == 6 || error.Number() == 13 || error.Number() == kRegistryInvalidParameter;
+    if (!badValue) throw error;
     m_problems.push_back(Where(name) + ": " + error.Description() + "; using " + used);
   }
 
