@@ -312,6 +312,9 @@ void NetworkPreferences::InitFromRegistry(RegistryStore& store) {
   std::string text = l.Interface();
   listener.String("Interface", text);
   l.SetInterface(text);
+  number = l.Port();
+  listener.Long("Port", number);
+  l.SetPort(number);
   number = l.FirstSlot();
   listener.Long("FirstSlot", number);
   l.SetFirstSlot(number);
@@ -388,6 +391,7 @@ void NetworkPreferences::SaveToRegistry(RegistryStore& store) const {
   listener.String("Transport", DMXTransportName(m_listener.Transport()));
   listener.Long("Universe", m_listener.Universe());
   listener.String("Interface", m_listener.Interface());
+  listener.Long("Port", m_listener.Port());
   listener.Long("FirstSlot", m_listener.FirstSlot());
   listener.Long("SlotCount", m_listener.SlotCount());
   listener.Long("Threshold", m_listener.Threshold());
@@ -441,6 +445,7 @@ std::vector<std::string> NetworkPreferences::Validate() const {
   Range(out, "refresh rate", m_refreshRate, 1, 1000);
   if (m_listener.Enabled()) {
     Range(out, "listener universe", m_listener.Universe(), 0, 63999);
+    Range(out, "listener port", m_listener.Port(), 0, 65535);
     Range(out, "listener first slot", m_listener.FirstSlot(), 1, 512);
     Range(out, "listener slot count", m_listener.SlotCount(), 1, 513 - m_listener.FirstSlot());
     Range(out, "listener threshold", m_listener.Threshold(), 1, 255);
