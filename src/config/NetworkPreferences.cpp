@@ -35,8 +35,10 @@ std::string Lower(std::string text) {
   return text;
 }
 
-// Reads one section's values, turning an unreadable value into its default
-// and a line in `problems`.
+// Reads one section's values, turning an unreadable value (of another type,
+// or a number out of range) into its default and a line in `problems`. A
+// store that cannot be read at all is raised instead: defaults standing in
+// for a whole configuration would reconfigure every network.
 class SectionReader {
  public:
   SectionReader(RegistryStore& store, std::string section, std::vector<std::string>& problems)
@@ -75,6 +77,9 @@ class SectionReader {
  private:
   std::string Where(const char* name) const { return "Shared\\" + m_section + "\\" + name; }
   void Problem(const char* name, const Error& error, const std::string& used) const {
+    bool badValue =
+        error.Number() == 6 || error.Number() == 13 || error.Number() == kRegistryInvalidParameter;
+    if (!badValue) throw error;
     m_problems.push_back(Where(name) + ": " + error.Description() + "; using " + used);
   }
 
@@ -307,6 +312,9 @@ void NetworkPreferences::InitFromRegistry(RegistryStore& store) {
   std::string text = l.Interface();
   listener.String("Interface", text);
   l.SetInterface(text);
+  number = l.Port();
+  listener.Long("Port", number);
+  l.SetPort(number);
   number = l.FirstSlot();
   listener.Long("FirstSlot", number);
   l.SetFirstSlot(number);
@@ -383,6 +391,7 @@ void NetworkPreferences::SaveToRegistry(RegistryStore& store) const {
   listener.String("Transport", DMXTransportName(m_listener.Transport()));
   listener.Long("Universe", m_listener.Universe());
   listener.String("Interface", m_listener.Interface());
+  listener.Long("Port", m_listener.Port());
   listener.Long("FirstSlot", m_listener.FirstSlot());
   listener.Long("SlotCount", m_listener.SlotCount());
   listener.Long("Threshold", m_listener.Threshold());
@@ -436,6 +445,7 @@ std::vector<std::string> NetworkPreferences::Validate() const {
   Range(out, "refresh rate", m_refreshRate, 1, 1000);
   if (m_listener.Enabled()) {
     Range(out, "listener universe", m_listener.Universe(), 0, 63999);
+    Range(out, "listener port", m_listener.Port(), 0, 65535);
     Range(out, "listener first slot", m_listener.FirstSlot(), 1, 512);
     Range(out, "listener slot count", m_listener.SlotCount(), 1, 513 - m_listener.FirstSlot());
     Range(out, "listener threshold", m_listener.Threshold(), 1, 255);

@@ -31,6 +31,7 @@ NetworkPreferences Sample() {
   prefs.Fennick().SetClampSpecialValues(true);
   prefs.Listener().SetEnabled(true);
   prefs.Listener().SetUniverse(64);
+  prefs.Listener().SetPort(5570);
   prefs.SetSyncUniverse(7000);
   return prefs;
 }
@@ -83,6 +84,25 @@ TEST(NetworkPreferences, AValueOfTheWrongTypeKeepsItsDefaultAndIsReported) {
   EXPECT_EQ(read.TAVNetwork(1).Port(), "");
   ASSERT_EQ(read.Problems().size(), 3u);
   EXPECT_NE(read.Problems()[0].find("Shared\\Network\\TAV0\\Speed"), std::string::npos);
+}
+
+// A store that fails every value read, as an unreadable settings file does.
+class FailingStore : public MemoryRegistryStore {
+ public:
+  int32_t QueryValueInfo(const std::string&, const std::string&, uint32_t&, uint32_t&) override {
+    return kRegistryIoFailed;
+  }
+  int32_t QueryValue(const std::string&, const std::string&, RegistryValue&) override {
+    return kRegistryIoFailed;
+  }
+};
+
+TEST(NetworkPreferences, AStoreThatCannotBeReadIsRaisedAndChangesNothing) {
+  FailingStore store;
+  RegistryCreateKey(store, SharedSettingsKey("Network"));
+  NetworkPreferences prefs = Sample();
+  EXPECT_EQ(testing::FailureOf([&] { prefs.InitFromRegistry(store); }).number, kRegistryIoFailed);
+  EXPECT_FALSE(prefs.DiffersFrom(Sample()));
 }
 
 TEST(NetworkPreferences, DiffersFromSeesEveryPart) {
