@@ -73,6 +73,18 @@ double EncoderChannelsPerSecond(tav::DimmerSpecialValues specials, bool allSpeci
   return kFrames * 4096.0 / seconds;
 }
 
+// The real serial adapter on the loop, with a pseudo-terminal for the
+// device.
+struct PtyRig {
+  explicit PtyRig(const std::string& name) : device(loop, TempPath(name)) {}
+  tav::EventLoop loop;
+  tav::AsioTimerService timers{loop};
+  tav::SystemClock clock;
+  tav::RecordingMessageLog log;
+  tav::PosixSerialPorts ports{loop};
+  tav::PtyDevice device;
+};
+
 // 2. Frame rate at 115200 baud, 574 channels.
 struct FrameRate {
   double achieved = 0;
@@ -81,12 +93,8 @@ struct FrameRate {
 };
 
 FrameRate MeasureFrameRate(double seconds) {
-  tav::EventLoop loop;
-  tav::AsioTimerService timers(loop);
-  tav::SystemClock clock;
-  tav::RecordingMessageLog log;
-  tav::PosixSerialPorts ports(loop);
-  tav::PtyDevice device(loop, TempPath("tav-bench-tty"));
+  PtyRig rig("tav-bench-tty");
+  auto& [loop, timers, clock, log, ports, device] = rig;
   tav::DimmerChainModel board(1, 574);
   std::vector<Steady::time_point> arrivals;
   board.Board(0).SetOnFrame([&](const auto&) { arrivals.push_back(Steady::now()); });
@@ -128,12 +136,8 @@ struct X10Rate {
 };
 
 X10Rate MeasureX10(int units) {
-  tav::EventLoop loop;
-  tav::AsioTimerService timers(loop);
-  tav::SystemClock clock;
-  tav::RecordingMessageLog log;
-  tav::PosixSerialPorts ports(loop);
-  tav::PtyDevice device(loop, TempPath("tav-bench-x10"));
+  PtyRig rig("tav-bench-x10");
+  auto& [loop, timers, clock, log, ports, device] = rig;
   tav::Cm11aModel model({}, tav::Cm11aModelTiming{60.0, false});
   auto nowMs = [&] { return static_cast<uint64_t>(clock.TickCount()); };
   device.SetOnBytes([&](std::span<const uint8_t> bytes) { model.FromHost(bytes, nowMs()); });
