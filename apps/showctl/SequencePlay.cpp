@@ -20,19 +20,23 @@
 #include "SettingsStore.h"
 #include "UserData.h"
 #include "config/NetworkPreferences.h"
+#include "platform/AsioTimerService.h"
 #include "platform/EventLoop.h"
 #include "platform/FileRegistryStore.h"
 #include "platform/LocalFileSystem.h"
 #include "platform/LockFileOutputClaim.h"
 #include "platform/PlatformPaths.h"
+#include "platform/PosixSerialPort.h"
 #include "platform/Realtime.h"
 #include "platform/SystemClock.h"
 #include "platform/TimerfdDeadlineTimer.h"
 #include "platform/UdpDatagramNetwork.h"
 #include "suite/channelio/ChannelIOControl.h"
 #include "suite/channelio/LevelViewDriver.h"
+#include "suite/channelio/serial/SerialOutputs.h"
 #include "suite/seqlib/FileSequenceLibrary.h"
 #include "suite/seqlib/PlayEvent.h"
+#include "support/Error.h"
 
 namespace tav::showctl {
 namespace {
@@ -89,6 +93,44 @@ void Dispatch(ChannelIO& control, const PlayEvent& e) {
   }
 }
 
+bool AnySerialNetwork(const NetworkPreferences& prefs) {
+  for (int32_t i = 0; i < kTAVNetworkCount; ++i) {
+    if (!prefs.TAVNetwork(i).Port().empty()) return true;
+  }
+  return !prefs.X10Port().empty() || !prefs.FennickPort().empty();
+}
+
+// Opens the serial networks as the show engine does: every TAV network with
+// a port, X10 and Fennick when the sequence uses them. A network that cannot
+// open stays off; the others play.
+void OpenSerialNetworks(ChannelIO& control, const NetworkPreferences& prefs,
+                        const Sequence& sequence, MessageLog& log) {
+  auto open = [&log](const std::string& what, const std::function<void()>& action) {
+    try {
+      action();
+    } catch (const Error& e) {
+      log.LogMessage(2, what + ": " + e.Description() + "; it stays off");
+    }
+  };
+  for (int32_t i = 0; i < kTAVNetworkCount; ++i) {
+    const TAVNetworkPreferences& tav = prefs.TAVNetwork(i);
+    if (tav.Port().empty()) continue;
+    open("TAV network " + std::to_string(i + 1) + " on " + tav.Port(), [&] {
+      control.SetTAVNetworkSpeed(i, tav.Speed());
+      control.SetTAVNetworkOldMCP(i, tav.OldMCP());
+      control.SetTAVNetworkEnhanced(i, tav.Enhanced());
+      control.SetTAVNetworkPort(i, tav.Port());
+    });
+  }
+  if (sequence.UsesX10() && !prefs.X10Port().empty()) {
+    open("X10 network on " + prefs.X10Port(), [&] { control.OpenX10Network(prefs.X10Port()); });
+  }
+  if (sequence.UsesFennick() && !prefs.FennickPort().empty()) {
+    open("Fennick network on " + prefs.FennickPort(),
+         [&] { control.OpenFennickNetwork(prefs.FennickPort()); });
+  }
+}
+
 std::string Summary(const ChannelIOStatistics& s, double seconds) {
   return fmt::format("{:.1f} s, {} frames, {} late (worst {} ms), {} packets sent, {} dropped",
                      seconds, s.frames, s.framesLate, s.maxLatenessMs, s.packetsSent,
@@ -114,7 +156,7 @@ int Play(const PlayOptions& o, const std::string& folder) {
                      static_cast<uint32_t>(u.Size())});
     configured.push_back(u.Universe());
   }
-  if (spans.empty()) {
+  if (spans.empty() && !AnySerialNetwork(prefs)) {
     throw CommandFailed("no DMX universe is set up in the network preferences (" + registryFile +
                         "); docs/outputs.md shows how to add one");
   }
@@ -145,7 +187,16 @@ int Play(const PlayOptions& o, const std::string& folder) {
   ports.log = &log;
   ports.settings = &store;
   ports.claim = &claim;
+  AsioTimerService timers(loop);
+  PosixSerialPorts serialPorts(loop);
+  ChannelIOControl* controlForInputs = nullptr;
+  SerialOutputs serial({&serialPorts, &timers, clock.get(), &log},
+                       [&controlForInputs](int32_t network, int32_t unit, int32_t input) {
+                         if (controlForInputs) controlForInputs->InjectInput(network, unit, input);
+                       });
+  ports.serial = &serial;
   ChannelIOControl control(ports);
+  controlForInputs = &control;
   control.ApplyNetworkPreferences(prefs);
   control.SetupClient(true, "showctl sequence play", true);
 
@@ -157,6 +208,7 @@ int Play(const PlayOptions& o, const std::string& folder) {
   std::shared_ptr<Sequence> sequence = library.CreateSequence();
   sequence->SetKeepAlive([&control] { control.KeepAlive(); });
   sequence->LoadFile(o.file);
+  OpenSerialNetworks(control, prefs, *sequence, log);
   sequence->SetLoopAtEnd(o.loop);
   sequence->SetLightsOffAtEnd(true);
   // Events are handed over one frame ahead: the pump after each frame then

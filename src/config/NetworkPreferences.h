@@ -250,8 +250,8 @@ class NetworkPreferences {
   std::string NetPrefUUIDKey() const { return "Network"; }
 
   // Replaces everything with what the registry holds (defaults where a value
-  // is missing or unreadable). Registry failures other than a bad value
-  // (an unreadable file, say) are raised.
+  // is missing or of the wrong type, each reported in Problems()). A store
+  // that fails (an unreadable file, say) is raised and changes nothing.
   void InitFromRegistry(RegistryStore& store);
   // Writes everything, removing DMX universe keys beyond the current count.
   // Does not touch "Ver": BumpVersion announces the change.

@@ -86,6 +86,25 @@ TEST(NetworkPreferences, AValueOfTheWrongTypeKeepsItsDefaultAndIsReported) {
   EXPECT_NE(read.Problems()[0].find("Shared\\Network\\TAV0\\Speed"), std::string::npos);
 }
 
+// A store that fails every value read, as an unreadable settings file does.
+class FailingStore : public MemoryRegistryStore {
+ public:
+  int32_t QueryValueInfo(const std::string&, const std::string&, uint32_t&, uint32_t&) override {
+    return kRegistryIoFailed;
+  }
+  int32_t QueryValue(const std::string&, const std::string&, RegistryValue&) override {
+    return kRegistryIoFailed;
+  }
+};
+
+TEST(NetworkPreferences, AStoreThatCannotBeReadIsRaisedAndChangesNothing) {
+  FailingStore store;
+  RegistryCreateKey(store, SharedSettingsKey("Network"));
+  NetworkPreferences prefs = Sample();
+  EXPECT_EQ(testing::FailureOf([&] { prefs.InitFromRegistry(store); }).number, kRegistryIoFailed);
+  EXPECT_FALSE(prefs.DiffersFrom(Sample()));
+}
+
 TEST(NetworkPreferences, DiffersFromSeesEveryPart) {
   NetworkPreferences base = Sample();
   std::vector<std::function<void(NetworkPreferences&)>> changes = {
