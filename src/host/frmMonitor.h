@@ -37,6 +37,7 @@
 #include "host/TrayOutbox.h"
 #include "schedule/MonitoredShowEvent.h"
 #include "schedule/Schedule.h"
+#include "schedule/ScheduleLookup.h"
 #include "schedule/YearSchedule.h"
 #include "show/ShowPlayerHost.h"
 #include "support/Error.h"
@@ -99,6 +100,12 @@ class frmMonitor : public TrayHost, public ShowPlayerHost {
   bool TrayConnected() const;
   // Called for every line of level 1 or more while no tray is connected.
   void SetLogEcho(HostLog::Echo echo) { m_logEcho = std::move(echo); }
+  // Called for every line of level 1 or more, whether a tray is connected or
+  // not (a simulation keeps its timeline with it).
+  void SetLogObserver(HostLog::Echo observer) { m_logObserver = std::move(observer); }
+  // What the last next-show step decided, with which source won and why
+  // (nothing decided yet: an empty decision).
+  const ShowDecision& LastShowDecision() const { return m_lastShowDecision; }
 
   // --- What the subsystems call ---
   void LogMessage(int32_t level, const std::string& szText,
@@ -148,6 +155,7 @@ class frmMonitor : public TrayHost, public ShowPlayerHost {
 
   // The next-show step, and applying its event.
   void NextShowStep();
+  ScheduleState CurrentScheduleState() const;
   void ApplyShowEvent(const std::shared_ptr<MonitoredShowEvent>& event);
   // The show of a show file, or null when it cannot be read (logged).
   std::shared_ptr<Show> ReadShowFile(const std::string& szFilename);
@@ -165,6 +173,7 @@ class frmMonitor : public TrayHost, public ShowPlayerHost {
   TrayOutbox m_outbox;
   HostLog m_log;
   HostLog::Echo m_logEcho;
+  HostLog::Echo m_logObserver;
   std::set<uint32_t> m_connectedWindows;
   std::unique_ptr<TrayMessaging> m_tray;
 
@@ -180,6 +189,7 @@ class frmMonitor : public TrayHost, public ShowPlayerHost {
   HostEnd m_end = HostEnd::kRunning;
 
   std::shared_ptr<MonitoredShowEvent> m_onDemandEvent;
+  ShowDecision m_lastShowDecision;
   std::shared_ptr<Schedule> m_weekSchedule;
   std::shared_ptr<YearSchedule> m_yearSchedule;
   std::unique_ptr<ShowPlayer> m_showPlayer;
