@@ -3,7 +3,9 @@
 #include <fmt/format.h>
 
 #include <algorithm>
+#include <cmath>
 #include <ctime>
+#include <exception>
 
 #include "CommandRegistry.h"
 #include "schedule/WeekTime.h"
@@ -61,6 +63,24 @@ DateTime MomentArgument(const std::string& text, const char* what, DateTime from
                     what, text));
   }
   return DateTimeArgument(text, what, earliest.AddSeconds(-1));
+}
+
+double SpeedArgument(const std::string& text) {
+  if (text == "max") return 0;
+  std::string number = text;
+  if (!number.empty() && (number.back() == 'x' || number.back() == 'X')) number.pop_back();
+  double factor = 0;
+  size_t used = 0;
+  try {
+    factor = std::stod(number, &used);
+  } catch (const std::exception&) {
+    used = 0;
+  }
+  if (number.empty() || used != number.size() || !std::isfinite(factor) || factor < 1) {
+    throw CommandFailed(fmt::format(
+        "the speed \"{}\" is neither \"max\" nor a factor of at least 1 such as \"60\"", text));
+  }
+  return factor;
 }
 
 }  // namespace tav::showctl

@@ -29,4 +29,8 @@ DateTime DateTimeArgument(const std::string& text, const char* what,
 DateTime MomentArgument(const std::string& text, const char* what, DateTime from,
                         bool strictlyAfter = false);
 
+// How fast virtual time runs: "max" (as fast as the machine can: 0), or a
+// factor over real time, "60" or "60x" (a minute each second), at least 1.
+double SpeedArgument(const std::string& text);
+
 }  // namespace tav::showctl

@@ -67,7 +67,6 @@ frmMonitor::frmMonitor(HostServices services)
       m_CIO(std::make_shared<SimulatedInputControl>(m_services.cio)),
       m_watchdog(m_settings, *m_services.memory, m_services.clock) {
   m_log.SetEcho([this](int32_t level, DateTime now, const std::string& text) {
-    if (m_logObserver) m_logObserver(level, now, text);
     if (m_logEcho && !TrayConnected()) m_logEcho(level, now, text);
   });
   TimerService& timers = m_services.timers;

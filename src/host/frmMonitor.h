@@ -21,6 +21,7 @@
 // comes from the loop.
 
 #include <cstdint>
+#include <functional>
 #include <memory>
 #include <set>
 #include <string>
@@ -100,9 +101,15 @@ class frmMonitor : public TrayHost, public ShowPlayerHost {
   bool TrayConnected() const;
   // Called for every line of level 1 or more while no tray is connected.
   void SetLogEcho(HostLog::Echo echo) { m_logEcho = std::move(echo); }
-  // Called for every line of level 1 or more, whether a tray is connected or
-  // not (a simulation keeps its timeline with it).
-  void SetLogObserver(HostLog::Echo observer) { m_logObserver = std::move(observer); }
+  // What a simulation watches, whether a tray is connected or not: every log
+  // line of level 1 or more with the sequence it is about (if any), and every
+  // sequence start and stop the tray is told of.
+  struct Observer {
+    std::function<void(int32_t level, const std::string& szText, const SequenceIdentity* seqInfo)>
+        onLog;
+    std::function<void(const SequenceIdentity& seqInfo, bool started)> onSequence;
+  };
+  void SetObserver(Observer observer) { m_observer = std::move(observer); }
   // What the last next-show step decided, with which source won and why
   // (nothing decided yet: an empty decision).
   const ShowDecision& LastShowDecision() const { return m_lastShowDecision; }
@@ -173,7 +180,7 @@ class frmMonitor : public TrayHost, public ShowPlayerHost {
   TrayOutbox m_outbox;
   HostLog m_log;
   HostLog::Echo m_logEcho;
-  HostLog::Echo m_logObserver;
+  Observer m_observer;
   std::set<uint32_t> m_connectedWindows;
   std::unique_ptr<TrayMessaging> m_tray;
 

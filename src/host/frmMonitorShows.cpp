@@ -135,14 +135,17 @@ void frmMonitor::SendStatusToTAVTray(bool boolForce) {
 void frmMonitor::LogMessage(int32_t level, const std::string& szText,
                             const SequenceIdentity* seqInfo) {
   m_log.LogMessage(level, szText, seqInfo);
+  if (m_observer.onLog && level >= 1 && !szText.empty()) m_observer.onLog(level, szText, seqInfo);
 }
 
 void frmMonitor::SendSequenceStartToTAVTray(const SequenceIdentity& seqInfo) {
   if (m_tray) m_tray->SendSequenceStartToTAVTray(seqInfo);
+  if (m_observer.onSequence) m_observer.onSequence(seqInfo, true);
 }
 
 void frmMonitor::SendSequenceStopToTAVTray(const SequenceIdentity& seqInfo) {
   if (m_tray) m_tray->SendSequenceStopToTAVTray(seqInfo);
+  if (m_observer.onSequence) m_observer.onSequence(seqInfo, false);
 }
 
 }  // namespace tav

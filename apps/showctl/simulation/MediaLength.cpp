@@ -87,8 +87,8 @@ std::optional<double> FlacSeconds(std::string_view head) {
   size_t block = at + 4;
   if ((Byte(head, block) & 0x7F) != 0) return std::nullopt;
   size_t info = block + 4;
-  uint32_t sampleRate = Byte(head, info + 10) << 12 | Byte(head, info + 11) << 4 |
-                        Byte(head, info + 12) >> 4;
+  uint32_t sampleRate =
+      Byte(head, info + 10) << 12 | Byte(head, info + 11) << 4 | Byte(head, info + 12) >> 4;
   uint64_t samples = static_cast<uint64_t>(Byte(head, info + 13) & 0x0F) << 32 |
                      static_cast<uint64_t>(Byte(head, info + 14)) << 24 |
                      Byte(head, info + 15) << 16 | Byte(head, info + 16) << 8 |
@@ -103,10 +103,17 @@ MediaLength ProbeMediaLength(const FileSystem& files, const std::string& path) {
   if (!status.IsFile()) return {MediaLength::Found::kUnreadable, 0, "it is a folder"};
   if (status.size == 0) return {MediaLength::Found::kUnreadable, 0, "the file is empty"};
   std::string head;
+  std::string tail;
   try {
     auto file = files.OpenForRead(path);
-    head.resize(static_cast<size_t>(std::min<uint64_t>(file->Size(), kHeadBytes)));
+    const uint64_t size = file->Size();
+    head.resize(static_cast<size_t>(std::min<uint64_t>(size, kHeadBytes)));
     head.resize(file->ReadAt(0, head.data(), head.size()));
+    // Ogg states its length on its last page only.
+    if (head.compare(0, 4, "OggS") == 0) {
+      tail.resize(static_cast<size_t>(std::min<uint64_t>(size, kHeadBytes)));
+      tail.resize(file->ReadAt(size - tail.size(), tail.data(), tail.size()));
+    }
   } catch (const Error& e) {
     return {MediaLength::Found::kUnreadable, 0, e.Description()};
   }
@@ -116,7 +123,21 @@ MediaLength ProbeMediaLength(const FileSystem& files, const std::string& path) {
   if (auto seconds = FlacSeconds(head)) {
     return {MediaLength::Found::kSeconds, *seconds, "FLAC header"};
   }
-  return {MediaLength::Found::kUnknown, 0, KindOf(path)};
+  if (auto seconds = OggSeconds(head, tail)) {
+    return {MediaLength::Found::kSeconds, *seconds, "Ogg pages"};
+  }
+  // Frame sync patterns turn up inside other formats too: MPEG audio is
+  // looked for only in files that say they are MP3 by name or by their start.
+  const std::string kind = KindOf(path);
+  const bool mpegByStart = head.compare(0, 3, "ID3") == 0 ||
+                           (head.size() >= 2 && static_cast<uint8_t>(head[0]) == 0xFF &&
+                            (static_cast<uint8_t>(head[1]) & 0xE0) == 0xE0);
+  if (kind == "MP3 file" || kind == "MP2 file" || mpegByStart) {
+    if (auto seconds = Mp3Seconds(head, status.size)) {
+      return {MediaLength::Found::kSeconds, *seconds, "MP3 frames"};
+    }
+  }
+  return {MediaLength::Found::kUnknown, 0, kind};
 }
 
 std::string LengthText(double seconds) {

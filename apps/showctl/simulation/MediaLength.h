@@ -1,14 +1,16 @@
 #pragma once
-// How long a media file plays, read from the file itself where that is
-// cheap: the header of a WAV file (RIFF, PCM or any other coding that states
-// its byte rate) or the STREAMINFO block of a FLAC file. For other formats
-// (MP3, Ogg, video) the length would take decoding or a media library, so it
-// is reported as unknown and the simulation lets the sequence's own length
-// decide. A file that is missing or cannot be opened is reported as such:
-// the real media player cannot play it either.
+// How long a media file plays, read from the file itself where that needs
+// no decoding: the header of a WAV file (RIFF, PCM or any other coding that
+// states its byte rate), the STREAMINFO block of a FLAC file, the first
+// frames of an MP3 file (a Xing/Info or VBRI frame count, else the constant
+// bit rate) and the last page of an Ogg Vorbis or Opus file. Other formats
+// (AAC, WMA, video) would take a media library, so their length is reported
+// as unknown and the simulation lets the sequence's own length decide. A
+// file that is missing or cannot be opened is reported as such: the real
+// media player cannot play it either.
 //
 // Free functions on the sequence library's FileSystem port; nothing is
-// written, and at most the first kHeadBytes of a file are read.
+// written, and at most the first and the last kHeadBytes of a file are read.
 
 #include <cstdint>
 #include <optional>
@@ -28,7 +30,7 @@ struct MediaLength {
   };
   Found found = Found::kUnknown;
   double seconds = 0;
-  // "WAV header", "FLAC header"; for kUnknown the kind of file ("MP3 file");
+  // "WAV header", "MP3 frames"; for kUnknown the kind of file ("MP3 file");
   // for kUnreadable the reason.
   std::string source;
 };
@@ -43,6 +45,14 @@ std::optional<double> WavSeconds(std::string_view head, uint64_t fileSize);
 // The length of a FLAC file from its STREAMINFO block (after an ID3v2 tag,
 // if any). Nothing when it is no FLAC file or it does not state its length.
 std::optional<double> FlacSeconds(std::string_view head);
+
+// The length of an MP3 file from its first bytes and its size (the first
+// frame's bit rate holds for the whole file when no frame count is given).
+// Nothing when no MPEG audio frame is found.
+std::optional<double> Mp3Seconds(std::string_view head, uint64_t fileSize);
+// The length of an Ogg Vorbis or Opus file from its first bytes (the
+// identification header) and its last (the final page's position).
+std::optional<double> OggSeconds(std::string_view head, std::string_view tail);
 
 MediaLength ProbeMediaLength(const FileSystem& files, const std::string& path);
 

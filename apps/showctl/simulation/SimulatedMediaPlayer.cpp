@@ -15,8 +15,8 @@ std::string BaseName(const std::string& path) {
 // The media type the real player would report, by the usual extensions of
 // video files; anything else plays as audio.
 std::string MediaTypeOf(const std::string& path) {
-  static constexpr std::array<const char*, 9> kVideo = {"mp4", "m4v", "mkv", "mov", "avi",
-                                                         "wmv", "webm", "mpg", "mpeg"};
+  static constexpr std::array<const char*, 9> kVideo = {"mp4", "m4v",  "mkv", "mov", "avi",
+                                                        "wmv", "webm", "mpg", "mpeg"};
   auto dot = path.find_last_of('.');
   if (dot == std::string::npos) return "audio";
   std::string ext = path.substr(dot + 1);
@@ -30,7 +30,9 @@ std::string MediaTypeOf(const std::string& path) {
 SimulatedMediaPlayer::SimulatedMediaPlayer(const Clock& clock, TimerService& timers,
                                            std::shared_ptr<const FileSystem> files,
                                            OnOpened onOpened)
-    : ScriptedMediaPlayer(clock, timers), m_files(std::move(files)), m_onOpened(std::move(onOpened)) {}
+    : ScriptedMediaPlayer(clock, timers),
+      m_files(std::move(files)),
+      m_onOpened(std::move(onOpened)) {}
 
 void SimulatedMediaPlayer::OpenMedia(const std::string& path) {
   MediaLength length = ProbeMediaLength(*m_files, path);

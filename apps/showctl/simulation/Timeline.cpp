@@ -28,7 +28,7 @@ const char* EventKindName(EventKind kind) {
   return "?";
 }
 
-void Timeline::Add(TimelineEvent event) {
+bool Timeline::Add(TimelineEvent event) {
   auto key = std::make_pair(event.kind, event.text);
   auto last = m_last.find(key);
   if (last != m_last.end()) {
@@ -36,13 +36,18 @@ void Timeline::Add(TimelineEvent event) {
     if (event.at.SecondsSince(earlier.lastAt) <= kFoldSeconds) {
       ++earlier.repeats;
       earlier.lastAt = event.at;
-      return;
+      return false;
     }
   }
   event.repeats = 0;
   event.lastAt = event.at;
+  const bool showEvent = event.kind == EventKind::kShowStart ||
+                         event.kind == EventKind::kShowWindingDown ||
+                         event.kind == EventKind::kShowEnd;
+  if (showEvent) m_last.clear();
   m_last[key] = m_events.size();
   m_events.push_back(std::move(event));
+  return true;
 }
 
 int64_t Timeline::Count(EventKind kind) const {
@@ -51,6 +56,12 @@ int64_t Timeline::Count(EventKind kind) const {
     if (e.kind == kind) count += 1 + e.repeats;
   }
   return count;
+}
+
+int64_t Timeline::Lines(EventKind kind) const {
+  int64_t lines = 0;
+  for (const TimelineEvent& e : m_events) lines += e.kind == kind ? 1 : 0;
+  return lines;
 }
 
 }  // namespace tav::simulation

@@ -7,9 +7,11 @@
 //
 // A line identical to one of the same kind added at most kFoldSeconds
 // before is folded into it, so that a problem the player reports every
-// second (a show file that cannot be read while its show is due) is one
-// line with a count and the time of its last repetition; counts include
-// the folded repetitions.
+// second (a show file that cannot be read while its show is due) or a
+// sequence that fails and restarts every millisecond is one line with a
+// count and the time of its last repetition; counts include the folded
+// repetitions. A show starting, winding down or ending closes every fold,
+// so that what happens around it keeps its order.
 
 #include <cstdint>
 #include <map>
@@ -59,12 +61,15 @@ class Timeline {
   static constexpr int64_t kFoldSeconds = 2;
 
   // Adds the event, or folds it into an identical one (same kind and text)
-  // added at most kFoldSeconds before.
-  void Add(TimelineEvent event);
+  // whose last repetition came at most kFoldSeconds before, with no show
+  // event between them. True when it was added as a line of its own.
+  bool Add(TimelineEvent event);
 
   const std::vector<TimelineEvent>& Events() const { return m_events; }
   // Events of the kind, each folded repetition counted.
   int64_t Count(EventKind kind) const;
+  // Lines of the kind.
+  int64_t Lines(EventKind kind) const;
 
  private:
   std::vector<TimelineEvent> m_events;

@@ -32,12 +32,7 @@ TrayLinkPair::Window& TrayLinkPair::Connect() {
 bool TrayLinkPair::Send(uint32_t targetHwnd, const TrayFrame& frame) {
   auto it = m_windows.find(targetHwnd);
   if (it == m_windows.end() || !it->second->m_open) return false;
-  Window& window = *it->second;
-  if (window.m_onReceived) {
-    window.m_onReceived(frame);
-  } else {
-    window.m_received.push_back(frame);
-  }
+  it->second->m_received.push_back(frame);
   return true;
 }
 

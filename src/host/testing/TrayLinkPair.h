@@ -3,11 +3,9 @@
 // player together without a socket. The player's side is the TrayLink; tray
 // windows are made with Connect() and live as long as the pair. A window's
 // Send delivers at once, inside the call, as a synchronous window message
-// does; frames sent to a window are kept in its Received() list, or handed
-// to the window's receiver when it has one.
+// does; frames sent to a window are kept in its Received() list.
 
 #include <cstdint>
-#include <functional>
 #include <map>
 #include <memory>
 #include <string>
@@ -28,11 +26,6 @@ class TrayLinkPair : public TrayLink {
     void Send(const TrayFrame& frame);
     const std::vector<TrayFrame>& Received() const { return m_received; }
     void ClearReceived() { m_received.clear(); }
-    // From here on, frames sent to this window go to `onReceived` as they
-    // are sent, and are no longer kept (a tray that runs for a long time).
-    void SetOnReceived(std::function<void(const TrayFrame&)> onReceived) {
-      m_onReceived = std::move(onReceived);
-    }
     void Close();
 
    private:
@@ -42,7 +35,6 @@ class TrayLinkPair : public TrayLink {
     uint32_t m_handle;
     bool m_open = true;
     std::vector<TrayFrame> m_received;
-    std::function<void(const TrayFrame&)> m_onReceived;
   };
 
   explicit TrayLinkPair(uint32_t ownHandle = 1);

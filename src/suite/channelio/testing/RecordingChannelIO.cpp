@@ -119,7 +119,6 @@ void RecordingChannelIO::OutputEffect(int32_t devType, int32_t lNetwork, uint8_t
 
 void RecordingChannelIO::OutputDMXLevels(int32_t lUniverse, int32_t nStartSlot, int32_t nCount,
                                          const uint8_t* levels, uint32_t dueTick) {
-  ++m_levelBlocks;
   if (m_recordLevels) {
     Record("OutputDMXLevels",
            "OutputDMXLevels(" + std::to_string(lUniverse) + ", " + std::to_string(nStartSlot) +
@@ -135,7 +134,6 @@ void RecordingChannelIO::OutputDMXLevels(int32_t lUniverse, int32_t nStartSlot, 
 
 void RecordingChannelIO::OutputTAVLevels(int32_t lNetwork, uint8_t byteUnit, int32_t nStartCircuit,
                                          int32_t nCount, const uint8_t* levels, uint32_t dueTick) {
-  ++m_levelBlocks;
   if (m_recordLevels) {
     Record("OutputTAVLevels",
            "OutputTAVLevels(" + std::to_string(lNetwork) + ", " + std::to_string(byteUnit) + ", " +
@@ -180,18 +178,6 @@ uint8_t RecordingChannelIO::TAVLevel(int32_t network, int32_t unit, int32_t circ
   if (it == m_tav.end() || circuit < 1 || static_cast<size_t>(circuit) > it->second.size())
     return 0;
   return it->second[circuit - 1];
-}
-
-std::vector<int32_t> RecordingChannelIO::DMXUniverses() const {
-  std::vector<int32_t> universes;
-  for (const auto& [universe, levels] : m_dmx) universes.push_back(universe);
-  return universes;
-}
-
-std::vector<std::pair<int32_t, int32_t>> RecordingChannelIO::TAVUnits() const {
-  std::vector<std::pair<int32_t, int32_t>> units;
-  for (const auto& [key, levels] : m_tav) units.emplace_back(std::get<0>(key), std::get<1>(key));
-  return units;
 }
 
 std::vector<std::string> RecordingChannelIO::RegisteredInputs() const {

@@ -12,7 +12,6 @@
 #include <optional>
 #include <string>
 #include <tuple>
-#include <utility>
 #include <vector>
 
 #include "suite/channelio/ChannelIO.h"
@@ -70,11 +69,6 @@ class RecordingChannelIO : public ChannelIO {
   // never sent.
   uint8_t DMXLevel(int32_t universe, int32_t slot) const;
   uint8_t TAVLevel(int32_t network, int32_t unit, int32_t circuit) const;
-  // The DMX universes and the TAV (network, unit) pairs sent levels so far,
-  // in order, and how many level blocks were sent in all (recorded or not).
-  std::vector<int32_t> DMXUniverses() const;
-  std::vector<std::pair<int32_t, int32_t>> TAVUnits() const;
-  uint64_t LevelBlocks() const { return m_levelBlocks; }
   // The registered inputs, as "network/unit/input".
   std::vector<std::string> RegisteredInputs() const;
 
@@ -89,7 +83,6 @@ class RecordingChannelIO : public ChannelIO {
 
   std::vector<Call> m_calls;
   bool m_recordLevels = true;
-  uint64_t m_levelBlocks = 0;
   std::map<int32_t, std::vector<uint8_t>> m_dmx;
   std::map<std::tuple<int32_t, int32_t>, std::vector<uint8_t>> m_tav;
   std::vector<ChannelInputEvent> m_inputs;
