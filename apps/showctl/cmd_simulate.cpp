@@ -86,10 +86,13 @@ void Simulate(const SimulateOptions& o) {
   }
   std::cout << simulation::SummaryText(report) << std::flush;
   if (report.Failed()) {
-    int64_t errors = report.timeline.Count(simulation::EventKind::kError);
+    const auto& timeline = report.timeline;
+    const int64_t lines = timeline.Lines(simulation::EventKind::kError);
+    const int64_t all = timeline.Count(simulation::EventKind::kError);
+    if (lines == 0) throw CommandFailed("the player ended before the simulation did", kExitFailed);
     throw CommandFailed(
-        errors > 0 ? fmt::format("the simulation found {} error{}", errors, errors == 1 ? "" : "s")
-                   : std::string("the player ended before the simulation did"),
+        fmt::format("the simulation found {} error{}{}", lines, lines == 1 ? "" : "s",
+                    all == lines ? "" : fmt::format(" ({} times in all)", all)),
         kExitFailed);
   }
 }
