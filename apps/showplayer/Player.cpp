@@ -20,7 +20,9 @@
 #include "platform/LocalTextFiles.h"
 #include "platform/LockFileOutputClaim.h"
 #include "platform/PlatformPaths.h"
+#include "platform/PosixFiles.h"
 #include "platform/PosixProcessSpawner.h"
+#include "platform/PosixSerialPort.h"
 #include "platform/Realtime.h"
 #include "platform/SystemClock.h"
 #include "platform/TimerfdDeadlineTimer.h"
@@ -29,6 +31,7 @@
 #include "platform/media/MpvMediaPlayer.h"
 #include "show/ShowPlayer.h"
 #include "suite/channelio/ChannelIOControl.h"
+#include "suite/channelio/serial/SerialOutputs.h"
 #include "suite/seqlib/FileSequenceLibrary.h"
 #include "suite/shellcmd/SpawningShellCommandManager.h"
 #include "support/Error.h"
@@ -138,6 +141,20 @@ int RunPlayer(const PlayerOptions& options) {
   std::shared_ptr<FileSystem> fileSystem = LocalFileSystem();
   auto resolver = std::make_shared<PathResolver>(
       fileSystem, PathResolver::DefaultFolders(settings.UserDataPath()));
+  // A crash or a power cut in the middle of writing a schedule or an
+  // exported sequence leaves its temporary beside it; nobody else will ever
+  // remove it. (The settings file's folder is cleaned by its store.)
+  {
+    std::string folders[] = {settings.UserDataPath(),
+                             resolver->Folder(PathResolver::kKindSequence)};
+    for (const std::string& folder : folders) {
+      if (folder.empty()) continue;
+      if (int removed = RemoveStaleTemporaries(folder); removed > 0) {
+        relay.LogMessage(1, "Removed " + std::to_string(removed) +
+                                " unfinished temporary file(s) from " + folder);
+      }
+    }
+  }
   NetworkPreferences prefs;
   try {
     prefs.InitFromRegistry(registry);
@@ -160,7 +177,17 @@ int RunPlayer(const PlayerOptions& options) {
   ports.log = &relay;
   ports.settings = &registry;
   ports.claim = &claim;
+  // The serial networks (TAV controllers, DMX widgets, X10, Fennick) open
+  // through these; an input a serial controller reports joins the others.
+  PosixSerialPorts serialPorts(loop);
+  ChannelIOControl* controlForInputs = nullptr;
+  SerialOutputs serial({&serialPorts, &timers, clock.get(), &relay},
+                       [&controlForInputs](int32_t network, int32_t unit, int32_t input) {
+                         if (controlForInputs) controlForInputs->InjectInput(network, unit, input);
+                       });
+  ports.serial = &serial;
   auto control = std::make_shared<ChannelIOControl>(ports);
+  controlForInputs = control.get();
 
   std::unique_ptr<MpvMediaPlayer> media;
   try {
