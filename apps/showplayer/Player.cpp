@@ -16,15 +16,14 @@
 #include "platform/FileRegistryStore.h"
 #include "platform/InstanceLock.h"
 #include "platform/LinuxProcessMemory.h"
+#include "platform/LocalChannelIO.h"
 #include "platform/LocalFileSystem.h"
 #include "platform/LocalTextFiles.h"
-#include "platform/LockFileOutputClaim.h"
 #include "platform/PlatformPaths.h"
+#include "platform/PosixFiles.h"
 #include "platform/PosixProcessSpawner.h"
 #include "platform/Realtime.h"
 #include "platform/SystemClock.h"
-#include "platform/TimerfdDeadlineTimer.h"
-#include "platform/UdpDatagramNetwork.h"
 #include "platform/UnixTrayLink.h"
 #include "platform/media/MpvMediaPlayer.h"
 #include "show/ShowPlayer.h"
@@ -127,6 +126,20 @@ int RunPlayer(const PlayerOptions& options) {
   std::shared_ptr<FileSystem> fileSystem = LocalFileSystem();
   auto resolver = std::make_shared<PathResolver>(
       fileSystem, PathResolver::DefaultFolders(settings.UserDataPath()));
+  // A crash or a power cut in the middle of writing a schedule or an
+  // exported sequence leaves its temporary beside it; nobody else will ever
+  // remove it. (The settings file's folder is cleaned by its store.)
+  {
+    std::string folders[] = {settings.UserDataPath(),
+                             resolver->Folder(PathResolver::kKindSequence)};
+    for (const std::string& folder : folders) {
+      if (folder.empty()) continue;
+      if (int removed = RemoveStaleTemporaries(folder); removed > 0) {
+        relay.LogMessage(1, "Removed " + std::to_string(removed) +
+                                " unfinished temporary file(s) from " + folder);
+      }
+    }
+  }
   NetworkPreferences prefs;
   try {
     prefs.InitFromRegistry(registry);
@@ -139,17 +152,8 @@ int RunPlayer(const PlayerOptions& options) {
   auto shellCommands = std::make_shared<SpawningShellCommandManager>(
       std::make_shared<PosixProcessSpawner>(), timers);
 
-  UdpDatagramNetwork network(loop);
-  TimerfdDeadlineTimer frameTimer(loop);
-  LockFileOutputClaim claim;
-  ChannelIOPorts ports;
-  ports.clock = clock.get();
-  ports.timer = &frameTimer;
-  ports.network = &network;
-  ports.log = &relay;
-  ports.settings = &registry;
-  ports.claim = &claim;
-  auto control = std::make_shared<ChannelIOControl>(ports);
+  LocalChannelIO channelIO(loop, *clock, timers, relay, registry);
+  const std::shared_ptr<ChannelIOControl>& control = channelIO.Control();
 
   std::unique_ptr<MpvMediaPlayer> media;
   try {

@@ -148,4 +148,27 @@ TEST_F(PlayerProcessTest, AScheduleThatCannotBeReadEndsThePlayerWithOneClearLine
 }
 
 }  // namespace
+TEST_F(PlayerProcessTest, TemporariesLeftByADeadWriterAreRemovedAtStart) {
+  // A writer that is certainly gone: a child that has ended and been reaped.
+  pid_t gone = ::fork();
+  if (gone == 0) ::_exit(0);
+  ::waitpid(gone, nullptr, 0);
+  std::string dead = ".show.tseq.tcs.tav-tmp-" + std::to_string(gone) + "-a1B2c3";
+  std::string live = ".other.tseq.tcs.tav-tmp-" + std::to_string(::getpid()) + "-d4E5f6";
+  m_folder.Write("data/Sequences/" + dead, "half");
+  m_folder.Write("data/Sequences/" + live, "being written");
+  m_folder.Write("data/Sequences/show.tseq", "kept");
+  m_folder.Write("data/" + dead, "half");
+
+  pid_t player = Start({});
+  ASSERT_TRUE(WaitForText("err.txt", "Schedule loaded", 20s)) << Read("err.txt");
+  EXPECT_FALSE(m_folder.Exists("data/Sequences/" + dead));
+  EXPECT_FALSE(m_folder.Exists("data/" + dead));
+  EXPECT_TRUE(m_folder.Exists("data/Sequences/" + live)) << "its writer is still running";
+  EXPECT_EQ(Read("data/Sequences/show.tseq"), "kept");
+  EXPECT_EQ(Count("err.txt", "unfinished temporary file(s)"), 2) << Read("err.txt");
+  ::kill(player, SIGTERM);
+  EXPECT_EQ(WaitFor(player, 10s), 0);
+}
+
 }  // namespace tav::player
