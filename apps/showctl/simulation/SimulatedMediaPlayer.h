@@ -4,7 +4,7 @@
 // told before each file opens what that file will do, as found from the
 // file itself (MediaLength):
 //  - a length read from its header: it plays that long and ends;
-//  - a length not read cheaply (MP3, Ogg, video): it plays until the
+//  - a length not read from the file (AAC, WMA, video): it plays until the
 //    sequence that started it ends and stops it, so the sequence's own
 //    length decides;
 //  - a file that is missing or cannot be opened: it fails to load with the
