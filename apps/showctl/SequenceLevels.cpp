@@ -16,7 +16,7 @@
 
 #include "CommandRegistry.h"
 #include "SequenceCommands.h"
-#include "ports/testing/ManualClock.h"
+#include "ports/ManualClock.h"
 #include "suite/seqlib/CompiledEventStream.h"
 #include "suite/seqlib/PlayEvent.h"
 #include "suite/seqlib/SequencePlayer.h"

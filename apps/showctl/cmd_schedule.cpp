@@ -16,7 +16,6 @@
 
 #include <algorithm>
 #include <cstdlib>
-#include <ctime>
 #include <filesystem>
 #include <iostream>
 #include <optional>
@@ -25,6 +24,7 @@
 
 #include "CommandRegistry.h"
 #include "ScheduleCheck.h"
+#include "TimeArguments.h"
 #include "platform/LocalTextFiles.h"
 #include "schedule/Schedule.h"
 #include "schedule/ScheduleFileCheck.h"
@@ -124,41 +124,6 @@ std::shared_ptr<WeekTime> WeekTimeArgument(const std::string& text, const char* 
                     what, text));
   }
   return *time;
-}
-
-// A date-time, or, when `after` is given, a time of day alone: the first such
-// time after `after`.
-DateTime DateTimeArgument(const std::string& text, const char* what,
-                          std::optional<DateTime> after = std::nullopt) {
-  std::optional<DateTime> value = DateTime::FromText(text);
-  if (!value) {
-    throw CommandFailed(fmt::format(
-        "the {} time \"{}\" is not a date and time such as \"2024-12-24 18:00\"", what, text));
-  }
-  bool timeAlone = value->Serial() >= 0 && value->Serial() < 1;
-  if (timeAlone) {
-    if (!after) {
-      throw CommandFailed(
-          fmt::format("the {} time \"{}\" needs a date, such as \"2024-12-24 18:00\"", what, text));
-    }
-    DateTime onDay = after->DateOnly().AddSeconds(value->SecondOfDay());
-    return onDay > *after ? onDay : onDay.AddDays(1);
-  }
-  return *value;
-}
-
-DateTime Now() {
-  std::time_t now = std::time(nullptr);
-  std::tm local{};
-  localtime_r(&now, &local);
-  return DateTime::FromParts(local.tm_year + 1900, local.tm_mon + 1, local.tm_mday, local.tm_hour,
-                             local.tm_min, std::min(local.tm_sec, 59));
-}
-
-std::string WeekdayName(DateTime t) {
-  static const char* const kNames[] = {"Sunday",   "Monday", "Tuesday", "Wednesday",
-                                       "Thursday", "Friday", "Saturday"};
-  return kNames[t.DayOfWeek()];
 }
 
 // The weekly show that holds the week time, or nothing.
@@ -356,26 +321,9 @@ void PrintDecision(const char* label, const ShowDecision& d) {
   std::cout << fmt::format("  {:<8} because {}\n", "", d.Reason);
 }
 
-// A date and time, or a day and time of the week: the next such moment from
-// now (now itself when it is that moment).
-DateTime MomentArgument(const std::string& text) {
-  if (auto weekly = WeekTimeFromInput(text)) {
-    DateTime now = Now();
-    int64_t ahead = ((*weekly)->TimeVal() - WeekTimeFromDate(now)->TimeVal() + kSecondsPerWeek) %
-                    kSecondsPerWeek;
-    return now.AddSeconds(ahead);
-  }
-  if (!DateTime::FromText(text)) {
-    throw CommandFailed(fmt::format(
-        "the asked time \"{}\" is neither a date and time such as \"2024-12-24 18:00\" nor a day "
-        "and time such as \"Mon 19:00\"",
-        text));
-  }
-  return DateTimeArgument(text, "asked");
-}
-
 void At(const ScheduleOptions& o) {
-  DateTime t = o.at.empty() ? Now() : MomentArgument(o.at);
+  DateTime now = LocalNow();
+  DateTime t = o.at.empty() ? now : MomentArgument(o.at, "asked", now);
   LocalTextFiles files;
   ScheduleState state;
   state.Week = ReadWeek(WeekPath(o), files);
@@ -450,8 +398,8 @@ void Register(CLI::App& app) {
   auto* at = schedule->add_subcommand(
       "at", "Which show the player would run at a time, which comes next, and why");
   at->add_option("time", o->at,
-                 "Date and time, \"2024-12-24 19:00\", or a day and time, \"Mon 19:00\" (the "
-                 "next such moment); default: now");
+                 "Date and time, \"2024-12-24 19:00\", or a day and time, \"Mon 19:00\", or a "
+                 "time, \"19:00\" (the next such moment); default: now");
   at->add_flag("--on-demand-only", o->onDemandOnly,
                "As the player started with /noschedule: the schedules do not count");
   fileOptions(at);

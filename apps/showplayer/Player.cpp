@@ -29,6 +29,7 @@
 #include "show/ShowPlayer.h"
 #include "suite/channelio/ChannelIOControl.h"
 #include "suite/seqlib/FileSequenceLibrary.h"
+#include "suite/seqlib/NetworkUniverseMap.h"
 #include "suite/shellcmd/SpawningShellCommandManager.h"
 #include "support/Error.h"
 
@@ -56,18 +57,6 @@ class LogRelay : public MessageLog {
   const Clock& m_clock;
   MessageLog* m_target = nullptr;
 };
-
-// FSEQ channels land on the universes of the network preferences.
-UniverseMap UniverseMapOf(const NetworkPreferences& prefs) {
-  std::vector<UniverseSpan> spans;
-  for (int32_t i = 0; i < prefs.DMXUniverseCount(); ++i) {
-    const DMXUniversePrefs& u = prefs.DMXUniverse(i);
-    if (!u.Enabled() || u.StartChannel() < 1 || u.Size() < 1 || u.Size() > 512) continue;
-    spans.push_back({u.Universe(), static_cast<uint32_t>(u.StartChannel() - 1),
-                     static_cast<uint32_t>(u.Size())});
-  }
-  return spans.empty() ? UniverseMap::Uniform() : UniverseMap::FromSpans(std::move(spans));
-}
 
 void Say(const std::string& text) {
   std::fprintf(stderr, "showplayer: %s\n", text.c_str());

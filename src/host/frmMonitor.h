@@ -21,6 +21,7 @@
 // comes from the loop.
 
 #include <cstdint>
+#include <functional>
 #include <memory>
 #include <set>
 #include <string>
@@ -37,6 +38,7 @@
 #include "host/TrayOutbox.h"
 #include "schedule/MonitoredShowEvent.h"
 #include "schedule/Schedule.h"
+#include "schedule/ScheduleLookup.h"
 #include "schedule/YearSchedule.h"
 #include "show/ShowPlayerHost.h"
 #include "support/Error.h"
@@ -99,6 +101,18 @@ class frmMonitor : public TrayHost, public ShowPlayerHost {
   bool TrayConnected() const;
   // Called for every line of level 1 or more while no tray is connected.
   void SetLogEcho(HostLog::Echo echo) { m_logEcho = std::move(echo); }
+  // What a simulation watches, whether a tray is connected or not: every log
+  // line of level 1 or more with the sequence it is about (if any), and every
+  // sequence start and stop the tray is told of.
+  struct Observer {
+    std::function<void(int32_t level, const std::string& szText, const SequenceIdentity* seqInfo)>
+        onLog;
+    std::function<void(const SequenceIdentity& seqInfo, bool started)> onSequence;
+  };
+  void SetObserver(Observer observer) { m_observer = std::move(observer); }
+  // What the last next-show step decided, with which source won and why
+  // (nothing decided yet: an empty decision).
+  const ShowDecision& LastShowDecision() const { return m_lastShowDecision; }
 
   // --- What the subsystems call ---
   void LogMessage(int32_t level, const std::string& szText,
@@ -148,6 +162,7 @@ class frmMonitor : public TrayHost, public ShowPlayerHost {
 
   // The next-show step, and applying its event.
   void NextShowStep();
+  ScheduleState CurrentScheduleState() const;
   void ApplyShowEvent(const std::shared_ptr<MonitoredShowEvent>& event);
   // The show of a show file, or null when it cannot be read (logged).
   std::shared_ptr<Show> ReadShowFile(const std::string& szFilename);
@@ -165,6 +180,7 @@ class frmMonitor : public TrayHost, public ShowPlayerHost {
   TrayOutbox m_outbox;
   HostLog m_log;
   HostLog::Echo m_logEcho;
+  Observer m_observer;
   std::set<uint32_t> m_connectedWindows;
   std::unique_ptr<TrayMessaging> m_tray;
 
@@ -180,6 +196,7 @@ class frmMonitor : public TrayHost, public ShowPlayerHost {
   HostEnd m_end = HostEnd::kRunning;
 
   std::shared_ptr<MonitoredShowEvent> m_onDemandEvent;
+  ShowDecision m_lastShowDecision;
   std::shared_ptr<Schedule> m_weekSchedule;
   std::shared_ptr<YearSchedule> m_yearSchedule;
   std::unique_ptr<ShowPlayer> m_showPlayer;

@@ -57,7 +57,8 @@ void frmMonitor::NextShowStep() {
   m_tmNextAction->SetEnabled(false);
   try {
     if (m_tray) m_tray->AnnounceReadiness();
-    ApplyShowEvent(CurrentShowEvent(m_services.clock.Now()));
+    m_lastShowDecision = tav::CurrentShowEvent(CurrentScheduleState(), m_services.clock.Now());
+    ApplyShowEvent(m_lastShowDecision.Event);
   } catch (const Error& e) {
     LogMessage(3, "tmNextAction_Timer Error: " + e.Description());
   } catch (const std::exception& e) {
@@ -109,9 +110,12 @@ bool frmMonitor::HasCurrentShow() const {
   return m_showPlayer && m_showPlayer->CurrentShow() != nullptr;
 }
 
+ScheduleState frmMonitor::CurrentScheduleState() const {
+  return ScheduleState{m_weekSchedule, m_yearSchedule, m_onDemandEvent, m_onDemandOnly};
+}
+
 std::shared_ptr<MonitoredShowEvent> frmMonitor::CurrentShowEvent(DateTime t) {
-  ScheduleState state{m_weekSchedule, m_yearSchedule, m_onDemandEvent, m_onDemandOnly};
-  return tav::CurrentShowEvent(state, t).Event;
+  return tav::CurrentShowEvent(CurrentScheduleState(), t).Event;
 }
 
 std::shared_ptr<MonitoredShowEvent> frmMonitor::RunningShowEvent() {
@@ -121,8 +125,7 @@ std::shared_ptr<MonitoredShowEvent> frmMonitor::RunningShowEvent() {
 
 std::shared_ptr<MonitoredShowEvent> frmMonitor::NextShowEvent(
     const std::shared_ptr<MonitoredShowEvent>& current, DateTime t) {
-  ScheduleState state{m_weekSchedule, m_yearSchedule, m_onDemandEvent, m_onDemandOnly};
-  return tav::NextShowEvent(state, current, t).Event;
+  return tav::NextShowEvent(CurrentScheduleState(), current, t).Event;
 }
 
 void frmMonitor::SendStatusToTAVTray(bool boolForce) {
@@ -132,14 +135,17 @@ void frmMonitor::SendStatusToTAVTray(bool boolForce) {
 void frmMonitor::LogMessage(int32_t level, const std::string& szText,
                             const SequenceIdentity* seqInfo) {
   m_log.LogMessage(level, szText, seqInfo);
+  if (m_observer.onLog && level >= 1 && !szText.empty()) m_observer.onLog(level, szText, seqInfo);
 }
 
 void frmMonitor::SendSequenceStartToTAVTray(const SequenceIdentity& seqInfo) {
   if (m_tray) m_tray->SendSequenceStartToTAVTray(seqInfo);
+  if (m_observer.onSequence) m_observer.onSequence(seqInfo, true);
 }
 
 void frmMonitor::SendSequenceStopToTAVTray(const SequenceIdentity& seqInfo) {
   if (m_tray) m_tray->SendSequenceStopToTAVTray(seqInfo);
+  if (m_observer.onSequence) m_observer.onSequence(seqInfo, false);
 }
 
 }  // namespace tav

@@ -1,4 +1,4 @@
-#include "ports/testing/ManualClock.h"
+#include "ports/ManualClock.h"
 
 namespace tav {
 

@@ -1,4 +1,4 @@
-#include "ports/testing/VirtualTimerService.h"
+#include "ports/VirtualTimerService.h"
 
 #include <algorithm>
 #include <map>

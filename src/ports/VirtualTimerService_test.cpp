@@ -1,11 +1,11 @@
-#include "ports/testing/VirtualTimerService.h"
+#include "ports/VirtualTimerService.h"
 
 #include <gtest/gtest.h>
 
 #include <stdexcept>
 
+#include "ports/ManualClock.h"
 #include "ports/testing/FixedProcessMemory.h"
-#include "ports/testing/ManualClock.h"
 
 namespace tav {
 namespace {
