@@ -39,6 +39,8 @@ constexpr const char* kShowWindingDown = "Current show is entering shutdown mode
 // paced, a tenth of a real second.
 constexpr uint64_t kFastStepMs = 60'000;
 constexpr auto kPacedStep = std::chrono::milliseconds(100);
+// Decoded FSEQ blocks kept between the plays of a sequence.
+constexpr size_t kFseqBlockCacheBytes = size_t{256} << 20;
 
 const char* SourceWord(ShowSource source) {
   switch (source) {
@@ -92,6 +94,9 @@ class Run {
     }
     auto files = std::make_shared<FileSequenceLibrary>(m_clock, m_fileSystem, resolver,
                                                        UniverseMapOf(prefs));
+    // A looping sequence plays hundreds of times in a simulated evening:
+    // inflate each block once. The files are only read here.
+    files->SetFseqBlockCache(std::make_shared<FseqBlockCache>(kFseqBlockCacheBytes));
     auto library = std::make_shared<ExportSkippingLibrary>(
         files, [this](const std::string& path) { Note("compressed export not written: " + path); });
     HostServices services{

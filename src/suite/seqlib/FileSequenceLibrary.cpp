@@ -72,12 +72,20 @@ uint64_t CombinedHash(uint64_t own, const std::vector<SubsequenceRef>& included,
   return CombinedContentHash(own, hashes);
 }
 
+std::unique_ptr<FseqFile> OpenFseq(std::shared_ptr<const RandomAccessFile> file,
+                                   std::shared_ptr<FseqBlockCache> cache) {
+  auto fseq = std::make_unique<FseqFile>(std::move(file));
+  fseq->SetBlockCache(std::move(cache));
+  return fseq;
+}
+
 }  // namespace
 
 struct FileSequenceLibrary::Core {
   std::shared_ptr<FileSystem> fileSystem;
   std::shared_ptr<const PathResolver> resolver;
   UniverseMap universes;
+  std::shared_ptr<FseqBlockCache> fseqBlocks;
 
   Format Detect(const RandomAccessFile& file) const {
     char head[16] = {};
@@ -146,8 +154,8 @@ struct FileSequenceLibrary::Core {
     info.levelBlockCount =
         static_cast<size_t>(fseq.FrameCount()) * FseqSegments(fseq, universes).size();
     UniverseMap map = universes;
-    content->openStream = [file, map] {
-      return std::make_unique<FseqEventStream>(std::make_unique<FseqFile>(file), map);
+    content->openStream = [file, map, cache = fseqBlocks] {
+      return std::make_unique<FseqEventStream>(OpenFseq(file, cache), map);
     };
     // Nothing to gain from an export: FSEQ is already a compiled form.
     content->hasBeenExported = [] { return true; };
@@ -300,13 +308,19 @@ FileSequenceLibrary::FileSequenceLibrary(std::shared_ptr<const Clock> clock,
                                          UniverseMap universes)
     : m_clock(std::move(clock)),
       m_core(std::make_shared<Core>(
-          Core{std::move(fileSystem), std::move(resolver), std::move(universes)})) {
+          Core{std::move(fileSystem), std::move(resolver), std::move(universes), nullptr})) {
   if (!m_clock || !m_core->fileSystem) throw errors::ObjectNotSet("FileSequenceLibrary");
 }
 
 void FileSequenceLibrary::SetUniverseMap(const UniverseMap& universes) {
   // Sequences made earlier keep the core they were made with.
-  m_core = std::make_shared<Core>(Core{m_core->fileSystem, m_core->resolver, universes});
+  m_core = std::make_shared<Core>(
+      Core{m_core->fileSystem, m_core->resolver, universes, m_core->fseqBlocks});
+}
+
+void FileSequenceLibrary::SetFseqBlockCache(std::shared_ptr<FseqBlockCache> cache) {
+  m_core = std::make_shared<Core>(
+      Core{m_core->fileSystem, m_core->resolver, m_core->universes, std::move(cache)});
 }
 
 std::shared_ptr<Sequence> FileSequenceLibrary::CreateSequence() {
@@ -380,7 +394,7 @@ std::unique_ptr<StreamedSequence> FileSequenceLibrary::OpenStreamed(const std::s
   switch (m_core->Detect(*file)) {
     case Format::Fseq: {
       uint64_t hash = hashFseq ? ContentHash(*file) : 0;
-      return std::make_unique<FseqStreamedSequence>(std::make_unique<FseqFile>(file),
+      return std::make_unique<FseqStreamedSequence>(OpenFseq(file, m_core->fseqBlocks),
                                                     m_core->universes, hash);
     }
     case Format::Compressed:

@@ -22,6 +22,7 @@
 #include <vector>
 
 #include "suite/seqlib/FileSystem.h"
+#include "suite/seqlib/FseqBlockCache.h"
 #include "suite/seqlib/PathResolver.h"
 #include "suite/seqlib/SequenceData.h"
 #include "suite/seqlib/SequenceLibrary.h"
@@ -41,6 +42,9 @@ class FileSequenceLibrary : public SequenceLibrary {
 
   // Network preferences may move universes; later loads use the new map.
   void SetUniverseMap(const UniverseMap& universes);
+  // FSEQ files opened later share decoded blocks through `cache` (see
+  // FseqBlockCache.h for who should); null, the default, shares nothing.
+  void SetFseqBlockCache(std::shared_ptr<FseqBlockCache> cache);
 
   std::shared_ptr<Sequence> CreateSequence() override;
   std::shared_ptr<Sequence> LoadCompressed(const std::string& path) override;

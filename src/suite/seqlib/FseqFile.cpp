@@ -276,13 +276,23 @@ const uint8_t* FseqFile::Frame(uint32_t n) {
                              [](uint32_t frame, const Block& b) { return frame < b.firstFrame; });
   size_t index = static_cast<size_t>(it - m_blocks.begin()) - 1;
   if (index != m_loadedBlock) LoadBlock(index);
-  return m_block.get() + static_cast<size_t>(n - m_blocks[index].firstFrame) * m_channelCount;
+  return m_blockData + static_cast<size_t>(n - m_blocks[index].firstFrame) * m_channelCount;
 }
 
 void FseqFile::LoadBlock(size_t index) {
   m_loadedBlock = kNoBlock;
+  m_cachedBlock.reset();
   const Block& block = m_blocks[index];
   size_t expected = static_cast<size_t>(block.frames) * m_channelCount;
+  if (m_cache) {
+    m_cachedBlock = m_cache->Find(m_file->Name(), m_file->Size(), block.offset);
+    if (m_cachedBlock && m_cachedBlock->size() == expected) {
+      m_blockData = m_cachedBlock->data();
+      m_loadedBlock = index;
+      return;
+    }
+    m_cachedBlock.reset();
+  }
   if (expected > m_blockCapacity) {
     // Left uninitialised: a damaged block that promises much and decodes
     // little costs address space, not memory.
@@ -294,6 +304,11 @@ void FseqFile::LoadBlock(size_t index) {
     InflateZstd(block, expected);
   } else {
     InflateZlib(block, expected);
+  }
+  m_blockData = m_block.get();
+  if (m_cache) {
+    m_cachedBlock = m_cache->Keep(m_file->Name(), m_file->Size(), block.offset,
+                                  std::vector<uint8_t>(m_block.get(), m_block.get() + expected));
   }
   m_loadedBlock = index;
 }

@@ -14,6 +14,7 @@
 #include <string>
 #include <vector>
 
+#include "suite/seqlib/FseqBlockCache.h"
 #include "suite/seqlib/RandomAccessFile.h"
 
 namespace tav {
@@ -65,6 +66,8 @@ class FseqFile {
   // The stored bytes of frame n (ChannelCount() of them), valid until the
   // next call; nullptr when n is past the last frame.
   const uint8_t* Frame(uint32_t n);
+  // Decoded blocks are looked for in, and added to, `cache` (may be null).
+  void SetBlockCache(std::shared_ptr<FseqBlockCache> cache) { m_cache = std::move(cache); }
   // Bytes of buffers held right now (decompressed block, read chunk, frame).
   size_t MemoryHeld() const;
 
@@ -107,6 +110,9 @@ class FseqFile {
   static constexpr size_t kNoBlock = static_cast<size_t>(-1);
   size_t m_loadedBlock = kNoBlock;
   std::unique_ptr<uint8_t[]> m_block;
+  const uint8_t* m_blockData = nullptr;  // m_block's bytes, or m_cachedBlock's
+  std::shared_ptr<FseqBlockCache> m_cache;
+  FseqBlockCache::Block m_cachedBlock;
   size_t m_blockCapacity = 0;
   std::vector<uint8_t> m_chunk;
   std::vector<uint8_t> m_frame;
