@@ -13,7 +13,6 @@
 #include <string_view>
 #include <vector>
 
-#include "config/Settings.h"
 #include "platform/media/MediaClock.h"
 #include "support/Error.h"
 
@@ -83,10 +82,6 @@ std::string DescribeAudioOutput(const MpvOutputs& outputs) {
 
 }  // namespace
 
-MpvOutputs MpvOutputs::FromSettings(const Settings& settings) {
-  return {settings.AudioOutput(), settings.AudioDevice(), settings.VideoOutput()};
-}
-
 struct MpvMediaPlayer::Impl : std::enable_shared_from_this<Impl> {
   Impl(EventLoop& loop, MessageLog& log) : loop(loop), log(log), tailTimer(loop.Context()) {}
 
@@ -118,6 +113,7 @@ struct MpvMediaPlayer::Impl : std::enable_shared_from_this<Impl> {
   void SetState(int32_t newState);
   void NotifyState(int32_t newState);
   void NotifyError();
+  void NotifyClock();
   template <typename Call>
   void PostToHandler(Call call);
 
@@ -157,6 +153,7 @@ struct MpvMediaPlayer::Impl : std::enable_shared_from_this<Impl> {
 
   std::function<void(int32_t)> onPlayStateChange;
   std::function<void()> onMediaError;
+  std::function<void(const MediaClock&)> onClockChange;
 };
 
 void MpvMediaPlayer::Impl::OnWakeup(void* data) noexcept {
@@ -246,6 +243,7 @@ void MpvMediaPlayer::Impl::Close() {
   tailTimer.cancel();
   onPlayStateChange = nullptr;
   onMediaError = nullptr;
+  onClockChange = nullptr;
   if (!handle) return;
   // Returns only when no callback runs any more, so mpv never sees the
   // wakeup target after this.
@@ -288,6 +286,7 @@ void MpvMediaPlayer::Impl::Handle(const mpv_event& event) {
       if (entryLive && state == kTransitioning) {
         if (mediaType.empty()) mediaType = "audio";  // the hook was missed: mpv too old?
         clock.Run(SteadyClock::now());
+        NotifyClock();
         SetState(kMediaPlaying);
       }
       break;
@@ -343,6 +342,7 @@ void MpvMediaPlayer::Impl::OnFileOpened(uint64_t hookId) {
     double duration = 0;
     if (mpv_get_property(handle, "duration", MPV_FORMAT_DOUBLE, &duration) >= 0) {
       clock.SetEnd(duration);
+      NotifyClock();
     }
   }
   mpv_hook_continue(handle, hookId);
@@ -418,6 +418,7 @@ void MpvMediaPlayer::Impl::OnProperty(uint64_t id, const mpv_event_property& pro
   auto now = SteadyClock::now();
   if (id == kTimePos && entryLive && property.format == MPV_FORMAT_DOUBLE) {
     clock.Report(*static_cast<const double*>(property.data), now);
+    NotifyClock();
   } else if (id == kCurrentAudioOutput && property.format == MPV_FORMAT_STRING) {
     std::string_view current = *static_cast<const char* const*>(property.data);
     if (current == "null" && outputs.audioOutput != "null" && !fellBackToNull) {
@@ -456,10 +457,16 @@ void MpvMediaPlayer::Impl::PostToHandler(Call call) {
 }
 
 void MpvMediaPlayer::Impl::NotifyState(int32_t newState) {
-  PostToHandler([newState](Impl& self) {
+  PostToHandler([newState, forGeneration = generation](Impl& self) {
+    // Overtaken by OpenMedia or Stop: said only when still true.
+    if (self.generation != forGeneration && self.state != newState) return;
     // A copy: the handler may replace itself.
     if (auto handler = self.onPlayStateChange) handler(newState);
   });
+}
+
+void MpvMediaPlayer::Impl::NotifyClock() {
+  if (onClockChange) onClockChange(clock);
 }
 
 void MpvMediaPlayer::Impl::NotifyError() {
@@ -562,6 +569,10 @@ void MpvMediaPlayer::SetOnPlayStateChange(std::function<void(int32_t)> handler) 
 
 void MpvMediaPlayer::SetOnMediaError(std::function<void()> handler) {
   m_impl->onMediaError = std::move(handler);
+}
+
+void MpvMediaPlayer::SetOnClockChange(std::function<void(const MediaClock&)> handler) {
+  m_impl->onClockChange = std::move(handler);
 }
 
 bool MpvMediaPlayer::HasVideoOutput() const {

@@ -3,8 +3,10 @@
 // sequences. OpenMedia replaces whatever plays and starts the file; the play
 // state goes to transitioning (9), then playing (3) once sound (or picture)
 // starts, and stopped (1) when the media has finished sounding, when Stop is
-// called, or when the file cannot be played. The position runs smoothly
-// between mpv's reports (MediaClock).
+// called, or when the file cannot be played. A play-state change that
+// OpenMedia or Stop overtook before it was raised is raised only if it is
+// still true, so each change raised holds for the play asked for last. The
+// position runs smoothly between mpv's reports (MediaClock).
 //
 // Threads: mpv runs its own threads, which touch nothing of ours but a
 // wakeup flag: its wakeup callback only posts a drain to the event loop, and
@@ -32,23 +34,12 @@
 #include <string>
 
 #include "platform/EventLoop.h"
+#include "platform/media/MediaClock.h"
+#include "platform/media/MpvOutputs.h"
 #include "ports/MessageLog.h"
 #include "show/MediaPlayer.h"
 
 namespace tav {
-
-class Settings;
-
-// The error number when mpv cannot be started at all.
-constexpr int32_t kMediaPlayerUnavailable = 429;
-
-struct MpvOutputs {
-  std::string audioOutput;  // mpv's "ao": "pulse", "alsa", "null"; empty: mpv's default
-  std::string audioDevice;  // mpv's "audio-device"; empty: the output's default
-  std::string videoOutput;  // mpv's "vo": "gpu", "drm", "null" (none); empty: mpv's default
-
-  static MpvOutputs FromSettings(const Settings& settings);
-};
 
 class MpvMediaPlayer : public MediaPlayer {
  public:
@@ -80,6 +71,12 @@ class MpvMediaPlayer : public MediaPlayer {
 
   void SetOnPlayStateChange(std::function<void(int32_t newState)> handler) override;
   void SetOnMediaError(std::function<void()> handler) override;
+
+  // For the media process, which hands the position on to the player: called
+  // on the loop, from inside this player's handling of mpv's events, each
+  // time the position clock of the current play takes a report, starts, or
+  // learns the media's length. The handler must not call this player.
+  void SetOnClockChange(std::function<void(const MediaClock& clock)> handler);
 
   // Whether showing the video form can show anything.
   bool HasVideoOutput() const;
