@@ -140,11 +140,12 @@ void MediaServer::StartWrite() {
     return;
   }
   m_sending.swap(m_unsent);
-  asio::async_write(m_socket, asio::buffer(m_sending), [this](const asio::error_code& error, size_t) {
-    m_sending.clear();
-    if (error) return Quit();  // the player has gone
-    StartWrite();
-  });
+  asio::async_write(m_socket, asio::buffer(m_sending),
+                    [this](const asio::error_code& error, size_t) {
+                      m_sending.clear();
+                      if (error) return Quit();  // the player has gone
+                      StartWrite();
+                    });
 }
 
 void MediaServer::Quit(const std::string& why) {

@@ -131,8 +131,8 @@ TEST_F(MediaProcessTest, PlaysAToneInTheMediaProcessAsMpvWould) {
   double early = player->CurrentPosition();
   ASSERT_TRUE(RunUntil([&] { return player->CurrentPosition() > early + 0.3; }))
       << "the position does not advance";
-  EXPECT_GT(player->LatestReport().position, 0.0);
-  EXPECT_NEAR(player->LatestReport().end, 0.8, 0.01);
+  EXPECT_GT(player->LatestReport().clock.position, 0.0);
+  EXPECT_NEAR(player->LatestReport().clock.end, 0.8, 0.01);
 
   ASSERT_TRUE(RunUntil([&] { return Saw(kMediaStopped); }));
   EXPECT_EQ(states, (std::vector<int32_t>{kTransitioning, kMediaPlaying, kMediaStopped}));
@@ -244,15 +244,17 @@ TEST_F(MediaProcessTest, ThePlayerMayBeDestroyedFromItsOwnEvent) {
 
 TEST_F(MediaProcessTest, CommandsReachTheMediaProcessAsTheProtocolWritesThem) {
   std::string heard = folder / "heard";
-  Make(Fake("recorder", "", "",
-            "  [ \"$1\" = ping ] || printf '%s\\n' \"$line\" >>" + heard + "\n"),
-       {"pulse", "my card", "gpu"});
+  Make(
+      Fake("recorder", "", "", "  [ \"$1\" = ping ] || printf '%s\\n' \"$line\" >>" + heard + "\n"),
+      {"pulse", "my card", "gpu"});
   Open("/music/a b.mp3");
   player->ShowVideoForm(100, -50);
   player->SetFullScreen(true);
   player->HideVideoForm();
   player->Stop();
-  RunUntil([&] { return folder.Exists("heard") && folder.Read("heard").find("stop") != std::string::npos; });
+  RunUntil([&] {
+    return folder.Exists("heard") && folder.Read("heard").find("stop") != std::string::npos;
+  });
   player.reset();  // waits for the media process to quit
   EXPECT_EQ(folder.Read("heard"),
             "outputs pulse my%20card gpu\n"
@@ -272,10 +274,16 @@ TEST_F(MediaProcessTest, ThePositionRunsOnFromTheMonotonicStampAndReportsOfOlder
   // first answered with reports of the play before it.
   Make(Fake("clock",
             "    open) old=$(($2 - 1))\n"
-            "      say state $old 3; say media $old video; say clock $old 50 " + ns + " 0 1\n"
-            "      if [ $2 = 1 ]; then say media 1 audio; say clock 1 10 " + ns + " 0 1\n"
-            "      else say media 2 video; say clock 2 20 " + ns + " 20.05 1; fi\n"
-            "      say state $2 3 ;;"));
+            "      say state $old 3; say media $old video; say clock $old 50 " +
+                ns +
+                " 0 1\n"
+                "      if [ $2 = 1 ]; then say media 1 audio; say clock 1 10 " +
+                ns +
+                " 0 1\n"
+                "      else say media 2 video; say clock 2 20 " +
+                ns +
+                " 20.05 1; fi\n"
+                "      say state $2 3 ;;"));
   Open("/a.mp3");
   ASSERT_TRUE(RunUntil([&] { return Saw(kMediaPlaying); }));
   auto before = SteadyClock::now();
@@ -287,8 +295,8 @@ TEST_F(MediaProcessTest, ThePositionRunsOnFromTheMonotonicStampAndReportsOfOlder
   EXPECT_GE(position, 10 + runOn(before));
   EXPECT_LE(position, 10 + runOn(after));
   EXPECT_EQ(typeWhenPlaying, "audio");
-  EXPECT_EQ(player->LatestReport().position, 10);
-  EXPECT_EQ(player->LatestReport().at, stamp);
+  EXPECT_EQ(player->LatestReport().clock.position, 10);
+  EXPECT_EQ(player->LatestReport().clock.at, stamp);
 
   Forget();
   Open("/b.mp4");
@@ -338,7 +346,7 @@ TEST_F(MediaProcessTest, AMediaProcessThatSaysWhatCannotBeReadIsEnded) {
     ASSERT_TRUE(RunUntil([&] { return mediaErrors > 0 && !log.lines.empty(); }));
     EXPECT_EQ(player->PlayState(), kMediaStopped);
     EXPECT_EQ(log.lines, std::vector<std::string>{"3 Media: the media process " + c.logged +
-                                                   "; the next media file starts a new one"});
+                                                  "; the next media file starts a new one"});
     ASSERT_EQ(player->ErrorCount(), 1);
     EXPECT_EQ(player->ErrorDescription(0), "Cannot play \"/a.mp3\": " + c.queued);
   }

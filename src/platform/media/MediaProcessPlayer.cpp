@@ -131,7 +131,7 @@ struct MediaProcessPlayer::Impl : std::enable_shared_from_this<Impl> {
   std::string mediaType;
   int32_t state = kMediaStopped;
   MediaClock clock;
-  MediaClock::Snapshot latestReport;
+  PositionReport latestReport;
   std::deque<std::string> errors;
 
   std::function<void(int32_t)> onPlayStateChange;
@@ -140,7 +140,8 @@ struct MediaProcessPlayer::Impl : std::enable_shared_from_this<Impl> {
 
 // Spawning returns at once: the media process loads libmpv on its own time.
 void MediaProcessPlayer::Impl::Start() {
-  SpawnedChild child = SpawnWithSocket(program, {"--fd", std::to_string(kChildSocket)}, kChildSocket);
+  SpawnedChild child =
+      SpawnWithSocket(program, {"--fd", std::to_string(kChildSocket)}, kChildSocket);
   auto fresh = std::make_shared<Link>(loop.Context());
   fresh->processId = child.processId;
   fresh->started = fresh->awaitingSince = SteadyClock::now();
@@ -190,8 +191,8 @@ void MediaProcessPlayer::Impl::StartWrite(const std::shared_ptr<Link>& on) {
 
 void MediaProcessPlayer::Impl::StartRead(const std::shared_ptr<Link>& on) {
   on->socket.async_read_some(
-      asio::buffer(on->received), [weak = weak_from_this(), on](const asio::error_code& error,
-                                                                size_t size) {
+      asio::buffer(on->received),
+      [weak = weak_from_this(), on](const asio::error_code& error, size_t size) {
         auto self = weak.lock();
         if (!self || self->link != on) return;
         if (error) {
@@ -258,10 +259,11 @@ void MediaProcessPlayer::Impl::Handle(const MediaMessage& message) {
     if (Current(type->generation)) mediaType = type->type;
   } else if (const auto* reported = std::get_if<media::Clock>(&message)) {
     if (!Current(reported->generation) || state == kMediaStopped) return;
-    latestReport = {reported->position,
-                    MediaClock::TimePoint(std::chrono::nanoseconds(reported->atNs)),
-                    reported->end, reported->running};
-    clock.Follow(latestReport);
+    latestReport.clock = {reported->position,
+                          MediaClock::TimePoint(std::chrono::nanoseconds(reported->atNs)),
+                          reported->end, reported->running};
+    latestReport.received = SteadyClock::now();
+    clock.Follow(latestReport.clock);
   } else if (const auto* queued = std::get_if<media::QueuedError>(&message)) {
     errors.push_back(queued->description);
     while (errors.size() > kMaxQueuedErrors) errors.pop_front();
@@ -388,8 +390,8 @@ void MediaProcessPlayer::Impl::Close() {
     // Best effort and without waiting: the media process also quits when
     // the link closes.
     std::string quit = EncodeMediaMessage(media::Quit{});
-    [[maybe_unused]] auto sent = ::send(link->socket.native_handle(), quit.data(), quit.size(),
-                                        MSG_NOSIGNAL | MSG_DONTWAIT);
+    [[maybe_unused]] auto sent =
+        ::send(link->socket.native_handle(), quit.data(), quit.size(), MSG_NOSIGNAL | MSG_DONTWAIT);
     asio::error_code ignored;
     link->socket.close(ignored);
     ending.push_back({link->processId, false, now + timing.quitWait, ""});
@@ -453,13 +455,13 @@ void MediaProcessPlayer::Impl::NotifyError() {
   });
 }
 
-MediaProcessPlayer::MediaProcessPlayer(EventLoop& loop, MessageLog& log,
-                                       const MpvOutputs& outputs, const std::string& program,
-                                       const MediaProcessTiming& timing)
+MediaProcessPlayer::MediaProcessPlayer(EventLoop& loop, MessageLog& log, const MpvOutputs& outputs,
+                                       const std::string& program, const MediaProcessTiming& timing)
     : m_impl(std::make_shared<Impl>(loop, log, outputs, program, timing)) {
   if (::access(program.c_str(), X_OK) != 0) {
+    std::string reason = std::strerror(errno);
     throw Error(kMediaPlayerUnavailable, kSource,
-                "Cannot start the media player: " + program + ": " + std::strerror(errno));
+                "Cannot start the media player: " + program + ": " + reason);
   }
   try {
     m_impl->Start();
@@ -556,7 +558,7 @@ int64_t MediaProcessPlayer::ProcessId() const {
   return m_impl->link ? m_impl->link->processId : 0;
 }
 
-MediaClock::Snapshot MediaProcessPlayer::LatestReport() const {
+MediaProcessPlayer::PositionReport MediaProcessPlayer::LatestReport() const {
   return m_impl->latestReport;
 }
 

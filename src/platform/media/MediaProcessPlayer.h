@@ -100,8 +100,12 @@ class MediaProcessPlayer : public MediaPlayer {
   // The running media process, 0 when none (tests and measurements).
   int64_t ProcessId() const;
   // The latest position report of the current play, as the media process
-  // took it from mpv (measurements).
-  MediaClock::Snapshot LatestReport() const;
+  // took it from mpv, and when it arrived here (measurements).
+  struct PositionReport {
+    MediaClock::Snapshot clock;
+    MediaClock::TimePoint received{};
+  };
+  PositionReport LatestReport() const;
 
  private:
   struct Impl;

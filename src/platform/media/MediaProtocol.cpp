@@ -17,10 +17,10 @@ constexpr const char* kSource = "MediaProtocol";
 template <typename T>
 struct Spec;
 
-#define TAV_MEDIA_SPEC(Type, word, ...)                          \
-  template <>                                                    \
-  struct Spec<media::Type> {                                     \
-    static constexpr const char* kWord = word;                   \
+#define TAV_MEDIA_SPEC(Type, word, ...)                                            \
+  template <>                                                                      \
+  struct Spec<media::Type> {                                                       \
+    static constexpr const char* kWord = word;                                     \
     static auto Fields([[maybe_unused]] auto& m) { return std::tie(__VA_ARGS__); } \
   }
 
@@ -91,7 +91,7 @@ class LineWriter {
   }
   void operator()(bool flag) { m_line += flag ? " 1" : " 0"; }
   template <typename Number>
-    requires std::is_arithmetic_v<Number>
+  requires std::is_arithmetic_v<Number>
   void operator()(Number value) {
     if constexpr (std::is_floating_point_v<Number>) {
       if (!std::isfinite(value)) throw Malformed("a number that is not finite cannot be sent");
@@ -142,7 +142,7 @@ class LineReader {
     flag = field == "1";
   }
   template <typename Number>
-    requires std::is_arithmetic_v<Number>
+  requires std::is_arithmetic_v<Number>
   void operator()(Number& value) {
     std::string_view field = Take();
     auto result = std::from_chars(field.data(), field.data() + field.size(), value);

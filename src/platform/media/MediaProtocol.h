@@ -28,26 +28,32 @@ namespace media {
 // The player to the media process. `generation` numbers the plays: each
 // OpenMedia and Stop gets the next one, and what the media process reports
 // carries the generation it concerns.
-struct Outputs {  std::string audioOutput, audioDevice, videoOutput;
+struct Outputs {
+  std::string audioOutput, audioDevice, videoOutput;
   bool operator==(const Outputs&) const = default;
 };
-struct Open {  uint64_t generation = 0;
+struct Open {
+  uint64_t generation = 0;
   std::string path;
   bool operator==(const Open&) const = default;
 };
-struct Stop {  uint64_t generation = 0;
+struct Stop {
+  uint64_t generation = 0;
   bool operator==(const Stop&) const = default;
 };
-struct FullScreen {  bool on = false;
+struct FullScreen {
+  bool on = false;
   bool operator==(const FullScreen&) const = default;
 };
-struct ShowVideo {  int32_t x = 0, y = 0;
+struct ShowVideo {
+  int32_t x = 0, y = 0;
   bool operator==(const ShowVideo&) const = default;
 };
 struct HideVideo {
   bool operator==(const HideVideo&) const = default;
 };
-struct Ping {  uint64_t serial = 0;
+struct Ping {
+  uint64_t serial = 0;
   bool operator==(const Ping&) const = default;
 };
 struct Quit {
@@ -55,44 +61,53 @@ struct Quit {
 };
 
 // The media process to the player.
-struct Hello {  int32_t version = 0;
+struct Hello {
+  int32_t version = 0;
   int64_t processId = 0;
   bool operator==(const Hello&) const = default;
 };
-struct Pong {  uint64_t serial = 0;
+struct Pong {
+  uint64_t serial = 0;
   bool operator==(const Pong&) const = default;
 };
-struct State {  uint64_t generation = 0;
+struct State {
+  uint64_t generation = 0;
   int32_t state = 0;
   bool operator==(const State&) const = default;
 };
-struct MediaType {  uint64_t generation = 0;
+struct MediaType {
+  uint64_t generation = 0;
   std::string type;
   bool operator==(const MediaType&) const = default;
 };
 // The position clock (MediaClock::Snapshot); `atNs` is CLOCK_MONOTONIC in
 // nanoseconds.
-struct Clock {  uint64_t generation = 0;
+struct Clock {
+  uint64_t generation = 0;
   double position = 0;
   int64_t atNs = 0;
   double end = 0;
   bool running = false;
   bool operator==(const Clock&) const = default;
 };
-struct QueuedError {  std::string description;
+struct QueuedError {
+  std::string description;
   bool operator==(const QueuedError&) const = default;
 };
 // The media error event; `state` is the play state when it was raised.
-struct MediaError {  uint64_t generation = 0;
+struct MediaError {
+  uint64_t generation = 0;
   int32_t state = 0;
   bool operator==(const MediaError&) const = default;
 };
-struct Log {  int32_t level = 0;
+struct Log {
+  int32_t level = 0;
   std::string text;
   bool operator==(const Log&) const = default;
 };
 // The media process cannot play anything and ends.
-struct Failed {  std::string description;
+struct Failed {
+  std::string description;
   bool operator==(const Failed&) const = default;
 };
 

@@ -41,8 +41,7 @@ const std::vector<Golden>& Goldens() {
       {media::Clock{7, 12.5, 123456789012345, 180.25, true},
        "clock 7 12.5 123456789012345 180.25 1\n"},
       {media::Clock{7, 0.1, 0, 0, false}, "clock 7 0.1 0 0 0\n"},
-      {media::Clock{7, 1.0 / 3, -5, 1e-300, true},
-       "clock 7 0.3333333333333333 -5 1e-300 1\n"},
+      {media::Clock{7, 1.0 / 3, -5, 1e-300, true}, "clock 7 0.3333333333333333 -5 1e-300 1\n"},
       {media::QueuedError{"Cannot play \"a b.wav\": file not found"},
        "error Cannot%20play%20\"a%20b.wav\":%20file%20not%20found\n"},
       {media::MediaError{7, 1}, "mediaerror 7 1\n"},
@@ -64,7 +63,8 @@ TEST(MediaProtocol, EveryMessageIsWrittenAsTheDocumentShowsAndReadsBack) {
 }
 
 TEST(MediaProtocol, ReadingAcceptsOtherwiseWrittenNumbersAndEscapes) {
-  EXPECT_EQ(DecodeMediaLine("clock 07 1.50 12 2e1 0"), (MediaMessage{media::Clock{7, 1.5, 12, 20, false}}));
+  EXPECT_EQ(DecodeMediaLine("clock 07 1.50 12 2e1 0"),
+            (MediaMessage{media::Clock{7, 1.5, 12, 20, false}}));
   EXPECT_EQ(DecodeMediaLine("media 3 %61udio"), (MediaMessage{media::MediaType{3, "audio"}}));
   EXPECT_EQ(DecodeMediaLine("log 1 %e2%82%ac"), (MediaMessage{media::Log{1, "\xe2\x82\xac"}}));
 }
