@@ -33,6 +33,11 @@ int main(int argc, char** argv) {
   ::prctl(PR_SET_PDEATHSIG, SIGKILL);
   // A player that has gone is seen as an error on the link, not a signal.
   std::signal(SIGPIPE, SIG_IGN);
+  // Ended by the player, not by a stop meant for the player: a service
+  // manager that stops the whole group lets the player shut down in order,
+  // and this process follows when the link closes.
+  std::signal(SIGTERM, SIG_IGN);
+  std::signal(SIGINT, SIG_IGN);
 
   tav::EventLoop loop;
   tav::MediaServer server(loop, fd);
