@@ -35,7 +35,7 @@ constexpr auto kReapPoll = std::chrono::milliseconds(10);
 using SteadyClock = std::chrono::steady_clock;
 using Socket = asio::local::stream_protocol::socket;
 
-std::string Seconds(SteadyClock::duration duration) {
+std::string DurationText(SteadyClock::duration duration) {
   auto ms = std::chrono::duration_cast<std::chrono::milliseconds>(duration).count();
   if (ms % 1000 == 0) return std::to_string(ms / 1000) + " s";
   return std::to_string(ms) + " ms";
@@ -300,7 +300,7 @@ void MediaProcessPlayer::Impl::OnPingTimer() {
   if (link->awaiting) {
     if (now - link->awaitingSince >= timing.answerBound) {
       EndLink(std::string(link->greeted ? "did not answer" : "did not start") + " within " +
-                  Seconds(timing.answerBound) + " and was ended",
+                  DurationText(timing.answerBound) + " and was ended",
               true, kEndedUnexpectedly);
       return;
     }
@@ -485,7 +485,7 @@ void MediaProcessPlayer::OpenMedia(const std::string& path) {
     auto now = SteadyClock::now();
     if (now < p.nextStartAllowed) {
       p.Fail("the media process keeps ending unexpectedly; it is tried again in " +
-             Seconds(std::chrono::ceil<std::chrono::seconds>(p.nextStartAllowed - now)));
+             DurationText(std::chrono::ceil<std::chrono::seconds>(p.nextStartAllowed - now)));
       return;
     }
     try {
