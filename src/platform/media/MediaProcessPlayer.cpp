@@ -24,6 +24,7 @@ namespace {
 
 constexpr const char* kSource = "MediaProcessPlayer";
 constexpr const char* kEndedUnexpectedly = "the media process ended unexpectedly";
+constexpr const char* kLogTail = "; the next media file starts a new one";
 // The media process's end of the socket pair, as its command line says.
 constexpr int kChildSocket = 3;
 // What may wait for a media process that does not read before it counts as
@@ -76,7 +77,7 @@ struct MediaProcessPlayer::Impl : std::enable_shared_from_this<Impl> {
     int64_t processId;
     bool killed;
     SteadyClock::time_point killAt;
-    std::string logWhenReaped;  // the line's start, to be completed with how it ended
+    std::string logWhenReaped;  // the log line's start; how it ended completes it
   };
 
   Impl(EventLoop& loop, MessageLog& log, const MpvOutputs& outputs, std::string program,
@@ -333,14 +334,13 @@ void MediaProcessPlayer::Impl::EndLink(const std::string& why, bool kill,
   nextStartAllowed = now + backOff;
 
   std::string line = "Media: the media process " + why;
-  std::string tail = "; the next media file starts a new one";
   if (kill) {
     KillChild(gone->processId);
-    log.LogMessage(3, line + tail);
+    log.LogMessage(3, line + kLogTail);
     ending.push_back({gone->processId, true, now, ""});
   } else {
     // Said once it is known how it ended: at once, as a rule.
-    ending.push_back({gone->processId, false, now + timing.quitWait, line + " (%s)" + tail});
+    ending.push_back({gone->processId, false, now + timing.quitWait, line});
   }
   ScheduleReap();
   if (state != kMediaStopped) Fail(playReason);
@@ -372,9 +372,8 @@ void MediaProcessPlayer::Impl::Reap() {
       return false;
     }
     if (!child.logWhenReaped.empty()) {
-      std::string line = child.logWhenReaped;
-      line.replace(line.find("%s"), 2, how->empty() ? "already reaped" : *how);
-      log.LogMessage(3, line);
+      log.LogMessage(3, child.logWhenReaped + " (" + (how->empty() ? "already reaped" : *how) +
+                            ")" + kLogTail);
     }
     return true;
   });
