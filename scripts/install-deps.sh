@@ -11,6 +11,8 @@ packages=(
   nlohmann-json3-dev libcli11-dev libfmt-dev
   libgtest-dev libgmock-dev googletest libbenchmark-dev
   python3
+  # Independent receivers for scripts/e2e-outputs.sh, and namespaces for it.
+  ola tshark iproute2
 )
 
 missing=()
@@ -36,5 +38,8 @@ fi
 
 echo "install-deps: installing ${missing[*]}"
 export DEBIAN_FRONTEND=noninteractive
+# tshark asks whether ordinary users may capture; answer no beforehand.
+echo "wireshark-common wireshark-common/install-setuid boolean false" |
+  "${sudo[@]}" debconf-set-selections
 "${sudo[@]}" apt-get update -qq
 "${sudo[@]}" env DEBIAN_FRONTEND=noninteractive apt-get install -y -qq --no-install-recommends "${missing[@]}"

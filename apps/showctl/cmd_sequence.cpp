@@ -1,13 +1,14 @@
 // showctl sequence: look inside a sequence file, check every byte of it,
-// print its levels at a moment, and convert between the formats the player
-// plays. The format of a file is judged by its content; the format written
-// is chosen by the output name (".tcs" for a compressed export, anything
-// else for the plain JSON format) unless --to says.
+// print its levels at a moment, convert between the formats the player
+// plays, and play one through the lighting outputs. The format of a file is judged by its content;
+// the format written is chosen by the output name (".tcs" for a compressed export, anything else
+// for the plain JSON format) unless --to says.
 
 #include <fmt/format.h>
 
 #include "CommandRegistry.h"
 #include "SequenceCommands.h"
+#include "SequencePlay.h"
 #include "UserData.h"
 #include "platform/LocalFileSystem.h"
 #include "platform/SystemClock.h"
@@ -99,6 +100,8 @@ void Register(CLI::App& app) {
   convert->add_option("--to", o->to,
                       "Output format, \"plain\" or \"tcs\" (default: by OUT's name)");
   convert->callback([o] { Convert(*o); });
+
+  AddSequencePlayCommand(group, &o->folder);
 }
 
 }  // namespace

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cctype>
 #include <random>
+#include <variant>
 
 #include "config/LibRegistry.h"
 #include "support/Error.h"
@@ -35,77 +36,195 @@ std::string Lower(std::string text) {
   return text;
 }
 
-// Reads one section's values, turning an unreadable value (of another type,
-// or a number out of range) into its default and a line in `problems`. A
-// store that cannot be read at all is raised instead: defaults standing in
-// for a whole configuration would reconfigure every network.
-class SectionReader {
- public:
-  SectionReader(RegistryStore& store, std::string section, std::vector<std::string>& problems)
-      : m_store(store), m_section(std::move(section)), m_problems(problems) {}
-
-  void Long(const char* name, int32_t& field) const {
-    try {
-      field = GetLongSetting(m_store, name, m_section, field);
-    } catch (const Error& error) {
-      Problem(name, error, std::to_string(field));
-    }
-  }
-  void Boolean(const char* name, bool& field) const {
-    try {
-      field = GetBooleanSetting(m_store, name, m_section, field);
-    } catch (const Error& error) {
-      Problem(name, error, field ? "true" : "false");
-    }
-  }
-  void String(const char* name, std::string& field) const {
-    try {
-      field = GetStringSetting(m_store, name, m_section, field);
-    } catch (const Error& error) {
-      Problem(name, error, "\"" + field + "\"");
-    }
-  }
-  void Transport(const char* name, DMXTransport& field) const {
-    std::string text = DMXTransportName(field);
-    String(name, text);
-    if (!DMXTransportFromName(text, field)) {
-      m_problems.push_back(Where(name) + ": unknown transport \"" + text + "\"; using " +
-                           DMXTransportName(field));
-    }
-  }
-
- private:
-  std::string Where(const char* name) const { return "Shared\\" + m_section + "\\" + name; }
-  void Problem(const char* name, const Error& error, const std::string& used) const {
-    bool badValue =
-        error.Number() == 6 || error.Number() == 13 || error.Number() == kRegistryInvalidParameter;
-    if (!badValue) throw error;
-    m_problems.push_back(Where(name) + ": " + error.Description() + "; using " + used);
-  }
-
-  RegistryStore& m_store;
-  std::string m_section;
-  std::vector<std::string>& m_problems;
+// One stored value of a preferences object: its name in the registry and
+// the object's getter and setter. Each part of the preferences lists its
+// values once (below), and reading and writing both walk that list.
+template <class P>
+struct LongField {
+  const char* name;
+  int32_t (P::*get)() const;
+  void (P::*set)(int32_t);
 };
-
-class SectionWriter {
- public:
-  SectionWriter(RegistryStore& store, std::string section)
-      : m_store(store), m_section(std::move(section)) {}
-  void Long(const char* name, int32_t value) const {
-    SetLongSetting(m_store, name, m_section, value);
-  }
-  void Boolean(const char* name, bool value) const {
-    SetBooleanSetting(m_store, name, m_section, value);
-  }
-  void String(const char* name, const std::string& value) const {
-    SetStringSetting(m_store, name, m_section, value);
-  }
-
- private:
-  RegistryStore& m_store;
-  std::string m_section;
+template <class P>
+struct BoolField {
+  const char* name;
+  bool (P::*get)() const;
+  void (P::*set)(bool);
 };
+template <class P>
+struct TextField {
+  const char* name;
+  const std::string& (P::*get)() const;
+  void (P::*set)(std::string);
+};
+template <class P>
+struct TransportField {
+  const char* name;
+  DMXTransport (P::*get)() const;
+  void (P::*set)(DMXTransport);
+};
+template <class P>
+using Field = std::variant<LongField<P>, BoolField<P>, TextField<P>, TransportField<P>>;
+
+template <class... Ts>
+struct Overloaded : Ts... {
+  using Ts::operator()...;
+};
+template <class... Ts>
+Overloaded(Ts...) -> Overloaded<Ts...>;
+
+// Reads one section's values into `object`, the value it already holds being
+// the default. An unreadable value (of another type, or a number out of
+// range) keeps the default and adds a line to `problems`. A store that
+// cannot be read at all is raised instead: defaults standing in for a whole
+// configuration would reconfigure every network.
+template <class P>
+void ReadFields(RegistryStore& store, const std::string& section, P& object,
+                const std::vector<Field<P>>& fields, std::vector<std::string>& problems) {
+  auto where = [&section](const char* name) { return "Shared\\" + section + "\\" + name; };
+  auto guarded = [&](const char* name, const std::string& used, auto read) {
+    try {
+      read();
+    } catch (const Error& error) {
+      bool badValue = error.Number() == 6 || error.Number() == 13 ||
+                      error.Number() == kRegistryInvalidParameter;
+      if (!badValue) throw;
+      problems.push_back(where(name) + ": " + error.Description() + "; using " + used);
+    }
+  };
+  for (const Field<P>& field : fields) {
+    std::visit(
+        Overloaded{
+            [&](const LongField<P>& f) {
+              int32_t value = (object.*f.get)();
+              guarded(f.name, std::to_string(value),
+                      [&] { (object.*f.set)(GetLongSetting(store, f.name, section, value)); });
+            },
+            [&](const BoolField<P>& f) {
+              bool value = (object.*f.get)();
+              guarded(f.name, value ? "true" : "false",
+                      [&] { (object.*f.set)(GetBooleanSetting(store, f.name, section, value)); });
+            },
+            [&](const TextField<P>& f) {
+              std::string value = (object.*f.get)();
+              guarded(f.name, "\"" + value + "\"",
+                      [&] { (object.*f.set)(GetStringSetting(store, f.name, section, value)); });
+            },
+            [&](const TransportField<P>& f) {
+              DMXTransport value = (object.*f.get)();
+              std::string text = DMXTransportName(value);
+              guarded(f.name, text, [&] { text = GetStringSetting(store, f.name, section, text); });
+              if (DMXTransportFromName(text, value)) {
+                (object.*f.set)(value);
+              } else {
+                problems.push_back(where(f.name) + ": unknown transport \"" + text + "\"; using " +
+                                   DMXTransportName(value));
+              }
+            },
+        },
+        field);
+  }
+}
+
+template <class P>
+void WriteFields(RegistryStore& store, const std::string& section, const P& object,
+                 const std::vector<Field<P>>& fields) {
+  for (const Field<P>& field : fields) {
+    std::visit(Overloaded{
+                   [&](const LongField<P>& f) {
+                     SetLongSetting(store, f.name, section, (object.*f.get)());
+                   },
+                   [&](const BoolField<P>& f) {
+                     SetBooleanSetting(store, f.name, section, (object.*f.get)());
+                   },
+                   [&](const TextField<P>& f) {
+                     SetStringSetting(store, f.name, section, (object.*f.get)());
+                   },
+                   [&](const TransportField<P>& f) {
+                     SetStringSetting(store, f.name, section, DMXTransportName((object.*f.get)()));
+                   },
+               },
+               field);
+  }
+}
+
+using N = NetworkPreferences;
+using T = TAVNetworkPreferences;
+using D = DMXUniversePrefs;
+using F = FennickPreferences;
+using L = DMXListenerPrefs;
+
+const std::vector<Field<N>>& TopFields() {
+  static const std::vector<Field<N>> fields = {
+      TextField<N>{"X10Port", &N::X10Port, &N::SetX10Port},
+      TextField<N>{"X10HouseCodes", &N::X10HouseCodes, &N::SetX10HouseCodes},
+      TextField<N>{"FennickPort", &N::FennickPort, &N::SetFennickPort},
+      TextField<N>{"SourceName", &N::SourceName, &N::SetSourceName},
+      LongField<N>{"MulticastTTL", &N::MulticastTTL, &N::SetMulticastTTL},
+      LongField<N>{"SyncUniverse", &N::SyncUniverse, &N::SetSyncUniverse},
+      LongField<N>{"RefreshRate", &N::RefreshRate, &N::SetRefreshRate},
+      TextField<N>{"SourceCID", &N::SourceCID, &N::SetSourceCID},
+  };
+  return fields;
+}
+
+const std::vector<Field<T>>& TAVFields() {
+  static const std::vector<Field<T>> fields = {
+      TextField<T>{"Port", &T::Port, &T::SetPort},
+      LongField<T>{"Speed", &T::Speed, &T::SetSpeed},
+      BoolField<T>{"OldMCP", &T::OldMCP, &T::SetOldMCP},
+      BoolField<T>{"Enhanced", &T::Enhanced, &T::SetEnhanced},
+      LongField<T>{"UnitCount", &T::UnitCount, &T::SetUnitCount},
+      LongField<T>{"CircuitsPerUnit", &T::CircuitsPerUnit, &T::SetCircuitsPerUnit},
+      LongField<T>{"StopBits", &T::StopBits, &T::SetStopBits},
+      LongField<T>{"DMXUniverse", &T::DMXUniverse, &T::SetDMXUniverse},
+      LongField<T>{"DMXStartSlot", &T::DMXStartSlot, &T::SetDMXStartSlot},
+  };
+  return fields;
+}
+
+const std::vector<Field<D>>& UniverseFields() {
+  static const std::vector<Field<D>> fields = {
+      LongField<D>{"Universe", &D::Universe, &D::SetUniverse},
+      TransportField<D>{"Transport", &D::Transport, &D::SetTransport},
+      TextField<D>{"Destination", &D::Destination, &D::SetDestination},
+      TextField<D>{"Interface", &D::Interface, &D::SetInterface},
+      LongField<D>{"Priority", &D::Priority, &D::SetPriority},
+      LongField<D>{"StartChannel", &D::StartChannel, &D::SetStartChannel},
+      LongField<D>{"Size", &D::Size, &D::SetSize},
+      TextField<D>{"Port", &D::Port, &D::SetPort},
+      BoolField<D>{"Enabled", &D::Enabled, &D::SetEnabled},
+  };
+  return fields;
+}
+
+const std::vector<Field<F>>& FennickFields() {
+  static const std::vector<Field<F>> fields = {
+      LongField<F>{"Speed", &F::Speed, &F::SetSpeed},
+      LongField<F>{"StopBits", &F::StopBits, &F::SetStopBits},
+      LongField<F>{"Boards", &F::Boards, &F::SetBoards},
+      LongField<F>{"ChannelsPerBoard", &F::ChannelsPerBoard, &F::SetChannelsPerBoard},
+      BoolField<F>{"HeaderPerBank", &F::HeaderPerBank, &F::SetHeaderPerBank},
+      BoolField<F>{"ClampSpecialValues", &F::ClampSpecialValues, &F::SetClampSpecialValues},
+  };
+  return fields;
+}
+
+const std::vector<Field<L>>& ListenerFields() {
+  static const std::vector<Field<L>> fields = {
+      BoolField<L>{"Enabled", &L::Enabled, &L::SetEnabled},
+      TransportField<L>{"Transport", &L::Transport, &L::SetTransport},
+      LongField<L>{"Universe", &L::Universe, &L::SetUniverse},
+      TextField<L>{"Interface", &L::Interface, &L::SetInterface},
+      LongField<L>{"Port", &L::Port, &L::SetPort},
+      LongField<L>{"FirstSlot", &L::FirstSlot, &L::SetFirstSlot},
+      LongField<L>{"SlotCount", &L::SlotCount, &L::SetSlotCount},
+      LongField<L>{"Threshold", &L::Threshold, &L::SetThreshold},
+      LongField<L>{"Network", &L::Network, &L::SetNetwork},
+      LongField<L>{"Unit", &L::Unit, &L::SetUnit},
+  };
+  return fields;
+}
 
 std::string NewVersionText() {
   std::random_device seed;
@@ -196,203 +315,41 @@ const DMXUniversePrefs* NetworkPreferences::FindDMXUniverse(int32_t universe) co
 void NetworkPreferences::InitFromRegistry(RegistryStore& store) {
   NetworkPreferences fresh;
   std::vector<std::string>& problems = fresh.m_problems;
-
-  SectionReader top(store, kSection, problems);
-  top.String("X10Port", fresh.m_x10Port);
-  top.String("X10HouseCodes", fresh.m_x10HouseCodes);
-  top.String("FennickPort", fresh.m_fennickPort);
-  top.String("SourceName", fresh.m_sourceName);
-  top.Long("MulticastTTL", fresh.m_multicastTTL);
-  top.Long("SyncUniverse", fresh.m_syncUniverse);
-  top.Long("RefreshRate", fresh.m_refreshRate);
-  top.String("SourceCID", fresh.m_sourceCID);
-
+  ReadFields(store, kSection, fresh, TopFields(), problems);
   for (int32_t i = 0; i < kTAVNetworkCount; ++i) {
-    TAVNetworkPreferences& tav = fresh.m_tav[i];
-    SectionReader reader(store, TAVSection(i), problems);
-    std::string port = tav.Port();
-    reader.String("Port", port);
-    tav.SetPort(port);
-    int32_t number = tav.Speed();
-    reader.Long("Speed", number);
-    tav.SetSpeed(number);
-    bool flag = tav.OldMCP();
-    reader.Boolean("OldMCP", flag);
-    tav.SetOldMCP(flag);
-    flag = tav.Enhanced();
-    reader.Boolean("Enhanced", flag);
-    tav.SetEnhanced(flag);
-    number = tav.UnitCount();
-    reader.Long("UnitCount", number);
-    tav.SetUnitCount(number);
-    number = tav.CircuitsPerUnit();
-    reader.Long("CircuitsPerUnit", number);
-    tav.SetCircuitsPerUnit(number);
-    number = tav.StopBits();
-    reader.Long("StopBits", number);
-    tav.SetStopBits(number);
-    number = tav.DMXUniverse();
-    reader.Long("DMXUniverse", number);
-    tav.SetDMXUniverse(number);
-    number = tav.DMXStartSlot();
-    reader.Long("DMXStartSlot", number);
-    tav.SetDMXStartSlot(number);
+    ReadFields(store, TAVSection(i), fresh.m_tav[i], TAVFields(), problems);
   }
-
   // DMX universes are the sub-keys 1, 2, 3 ... in order; the list ends at
-  // the first number that is missing.
-  std::string listKey = SharedSettingsKey(DMXListSection());
+  // the first number that is missing. A universe without a start channel
+  // follows the one before it.
   for (size_t index = 0;; ++index) {
     std::string section = DMXSection(index);
     if (!RegistryKeyExists(store, SharedSettingsKey(section))) break;
     DMXUniversePrefs prefs;
-    SectionReader reader(store, section, problems);
-    int32_t number = prefs.Universe();
-    reader.Long("Universe", number);
-    prefs.SetUniverse(number);
-    DMXTransport transport = prefs.Transport();
-    reader.Transport("Transport", transport);
-    prefs.SetTransport(transport);
-    std::string text = prefs.Destination();
-    reader.String("Destination", text);
-    prefs.SetDestination(text);
-    text = prefs.Interface();
-    reader.String("Interface", text);
-    prefs.SetInterface(text);
-    number = prefs.Priority();
-    reader.Long("Priority", number);
-    prefs.SetPriority(number);
-    number = static_cast<int32_t>(index) * 512 + 1;
-    reader.Long("StartChannel", number);
-    prefs.SetStartChannel(number);
-    number = prefs.Size();
-    reader.Long("Size", number);
-    prefs.SetSize(number);
-    text = prefs.Port();
-    reader.String("Port", text);
-    prefs.SetPort(text);
-    bool enabled = prefs.Enabled();
-    reader.Boolean("Enabled", enabled);
-    prefs.SetEnabled(enabled);
+    prefs.SetStartChannel(static_cast<int32_t>(index) * 512 + 1);
+    ReadFields(store, section, prefs, UniverseFields(), problems);
     fresh.m_universes.push_back(prefs);
   }
-
-  SectionReader fennick(store, FennickSection(), problems);
-  FennickPreferences& f = fresh.m_fennick;
-  int32_t number = f.Speed();
-  fennick.Long("Speed", number);
-  f.SetSpeed(number);
-  number = f.StopBits();
-  fennick.Long("StopBits", number);
-  f.SetStopBits(number);
-  number = f.Boards();
-  fennick.Long("Boards", number);
-  f.SetBoards(number);
-  number = f.ChannelsPerBoard();
-  fennick.Long("ChannelsPerBoard", number);
-  f.SetChannelsPerBoard(number);
-  bool flag = f.HeaderPerBank();
-  fennick.Boolean("HeaderPerBank", flag);
-  f.SetHeaderPerBank(flag);
-  flag = f.ClampSpecialValues();
-  fennick.Boolean("ClampSpecialValues", flag);
-  f.SetClampSpecialValues(flag);
-
-  SectionReader listener(store, ListenerSection(), problems);
-  DMXListenerPrefs& l = fresh.m_listener;
-  flag = l.Enabled();
-  listener.Boolean("Enabled", flag);
-  l.SetEnabled(flag);
-  DMXTransport transport = l.Transport();
-  listener.Transport("Transport", transport);
-  l.SetTransport(transport);
-  number = l.Universe();
-  listener.Long("Universe", number);
-  l.SetUniverse(number);
-  std::string text = l.Interface();
-  listener.String("Interface", text);
-  l.SetInterface(text);
-  number = l.FirstSlot();
-  listener.Long("FirstSlot", number);
-  l.SetFirstSlot(number);
-  number = l.SlotCount();
-  listener.Long("SlotCount", number);
-  l.SetSlotCount(number);
-  number = l.Threshold();
-  listener.Long("Threshold", number);
-  l.SetThreshold(number);
-  number = l.Network();
-  listener.Long("Network", number);
-  l.SetNetwork(number);
-  number = l.Unit();
-  listener.Long("Unit", number);
-  l.SetUnit(number);
-
+  ReadFields(store, FennickSection(), fresh.m_fennick, FennickFields(), problems);
+  ReadFields(store, ListenerSection(), fresh.m_listener, ListenerFields(), problems);
   *this = std::move(fresh);
 }
 
 void NetworkPreferences::SaveToRegistry(RegistryStore& store) const {
-  SectionWriter top(store, kSection);
-  top.String("X10Port", m_x10Port);
-  top.String("X10HouseCodes", m_x10HouseCodes);
-  top.String("FennickPort", m_fennickPort);
-  top.String("SourceName", m_sourceName);
-  top.Long("MulticastTTL", m_multicastTTL);
-  top.Long("SyncUniverse", m_syncUniverse);
-  top.Long("RefreshRate", m_refreshRate);
-  top.String("SourceCID", m_sourceCID);
-
+  WriteFields(store, kSection, *this, TopFields());
   for (int32_t i = 0; i < kTAVNetworkCount; ++i) {
-    const TAVNetworkPreferences& tav = m_tav[i];
-    SectionWriter writer(store, TAVSection(i));
-    writer.String("Port", tav.Port());
-    writer.Long("Speed", tav.Speed());
-    writer.Boolean("OldMCP", tav.OldMCP());
-    writer.Boolean("Enhanced", tav.Enhanced());
-    writer.Long("UnitCount", tav.UnitCount());
-    writer.Long("CircuitsPerUnit", tav.CircuitsPerUnit());
-    writer.Long("StopBits", tav.StopBits());
-    writer.Long("DMXUniverse", tav.DMXUniverse());
-    writer.Long("DMXStartSlot", tav.DMXStartSlot());
+    WriteFields(store, TAVSection(i), m_tav[i], TAVFields());
   }
-
   for (size_t index = 0; index < m_universes.size(); ++index) {
-    const DMXUniversePrefs& prefs = m_universes[index];
-    SectionWriter writer(store, DMXSection(index));
-    writer.Long("Universe", prefs.Universe());
-    writer.String("Transport", DMXTransportName(prefs.Transport()));
-    writer.String("Destination", prefs.Destination());
-    writer.String("Interface", prefs.Interface());
-    writer.Long("Priority", prefs.Priority());
-    writer.Long("StartChannel", prefs.StartChannel());
-    writer.Long("Size", prefs.Size());
-    writer.String("Port", prefs.Port());
-    writer.Boolean("Enabled", prefs.Enabled());
+    WriteFields(store, DMXSection(index), m_universes[index], UniverseFields());
   }
   for (size_t index = m_universes.size();; ++index) {
     std::string key = SharedSettingsKey(DMXSection(index));
     if (!RegistryKeyExists(store, key)) break;
     RegistryDeleteKey(store, key);
   }
-
-  SectionWriter fennick(store, FennickSection());
-  fennick.Long("Speed", m_fennick.Speed());
-  fennick.Long("StopBits", m_fennick.StopBits());
-  fennick.Long("Boards", m_fennick.Boards());
-  fennick.Long("ChannelsPerBoard", m_fennick.ChannelsPerBoard());
-  fennick.Boolean("HeaderPerBank", m_fennick.HeaderPerBank());
-  fennick.Boolean("ClampSpecialValues", m_fennick.ClampSpecialValues());
-
-  SectionWriter listener(store, ListenerSection());
-  listener.Boolean("Enabled", m_listener.Enabled());
-  listener.String("Transport", DMXTransportName(m_listener.Transport()));
-  listener.Long("Universe", m_listener.Universe());
-  listener.String("Interface", m_listener.Interface());
-  listener.Long("FirstSlot", m_listener.FirstSlot());
-  listener.Long("SlotCount", m_listener.SlotCount());
-  listener.Long("Threshold", m_listener.Threshold());
-  listener.Long("Network", m_listener.Network());
-  listener.Long("Unit", m_listener.Unit());
+  WriteFields(store, FennickSection(), m_fennick, FennickFields());
+  WriteFields(store, ListenerSection(), m_listener, ListenerFields());
 }
 
 void NetworkPreferences::BumpVersion(RegistryStore& store) {
@@ -441,6 +398,7 @@ std::vector<std::string> NetworkPreferences::Validate() const {
   Range(out, "refresh rate", m_refreshRate, 1, 1000);
   if (m_listener.Enabled()) {
     Range(out, "listener universe", m_listener.Universe(), 0, 63999);
+    Range(out, "listener port", m_listener.Port(), 0, 65535);
     Range(out, "listener first slot", m_listener.FirstSlot(), 1, 512);
     Range(out, "listener slot count", m_listener.SlotCount(), 1, 513 - m_listener.FirstSlot());
     Range(out, "listener threshold", m_listener.Threshold(), 1, 255);

@@ -169,6 +169,10 @@ class DMXListenerPrefs {
   void SetUniverse(int32_t value) { m_universe = value; }
   const std::string& Interface() const { return m_interface; }
   void SetInterface(std::string value) { m_interface = std::move(value); }
+  // The UDP port listened on; 0 = the protocol's own (5568 E1.31, 6454
+  // Art-Net).
+  int32_t Port() const { return m_port; }
+  void SetPort(int32_t value) { m_port = value; }
   int32_t FirstSlot() const { return m_firstSlot; }
   void SetFirstSlot(int32_t value) { m_firstSlot = value; }
   int32_t SlotCount() const { return m_slotCount; }
@@ -189,6 +193,7 @@ class DMXListenerPrefs {
   DMXTransport m_transport = DMXTransport::kE131;
   int32_t m_universe = 1;
   std::string m_interface;
+  int32_t m_port = 0;
   int32_t m_firstSlot = 1;
   int32_t m_slotCount = 512;
   int32_t m_threshold = 128;

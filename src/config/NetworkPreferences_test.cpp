@@ -31,6 +31,7 @@ NetworkPreferences Sample() {
   prefs.Fennick().SetClampSpecialValues(true);
   prefs.Listener().SetEnabled(true);
   prefs.Listener().SetUniverse(64);
+  prefs.Listener().SetPort(5570);
   prefs.SetSyncUniverse(7000);
   return prefs;
 }

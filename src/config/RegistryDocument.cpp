@@ -24,6 +24,7 @@ bool IsBelow(std::string_view path, std::string_view ancestor, std::string_view*
 bool PathLess(std::string_view a, std::string_view b) {
   size_t n = std::min(a.size(), b.size());
   for (size_t i = 0; i < n; ++i) {
+    if (a[i] == b[i]) continue;
     char x = a[i] == '\\' ? '\0' : Lower(a[i]);
     char y = b[i] == '\\' ? '\0' : Lower(b[i]);
     if (x != y) return x < y;
@@ -40,8 +41,12 @@ std::string_view TrimSeparators(std::string_view key) {
 }  // namespace
 
 bool RegistryDocument::SameName(std::string_view a, std::string_view b) {
-  return a.size() == b.size() && std::equal(a.begin(), a.end(), b.begin(),
-                                            [](char x, char y) { return Lower(x) == Lower(y); });
+  // From the end, where sibling keys differ ("...\DMX\17"), and bytes that
+  // are equal need no case folding: a document of a thousand keys is
+  // searched often while the network preferences load.
+  return a.size() == b.size() && std::equal(a.rbegin(), a.rend(), b.rbegin(), [](char x, char y) {
+           return x == y || Lower(x) == Lower(y);
+         });
 }
 
 std::string RegistryDocument::UserPath(std::string_view key) {

@@ -264,9 +264,12 @@ void FseqFile::BuildBlocks(const std::vector<uint8_t>& header, uint32_t indexEnt
 const uint8_t* FseqFile::Frame(uint32_t n) {
   if (n >= m_frameCount) return nullptr;
   if (m_compression == Compression::None) {
+    if (n == m_frameHeld) return m_frame.data();
+    m_frameHeld = UINT32_MAX;
     m_frame.resize(m_channelCount);
     ReadExactly(*m_file, m_dataOffset + static_cast<uint64_t>(n) * m_channelCount, m_frame.data(),
                 m_channelCount, kSource, "frame " + std::to_string(n));
+    m_frameHeld = n;
     return m_frame.data();
   }
   auto it = std::upper_bound(m_blocks.begin(), m_blocks.end(), n,

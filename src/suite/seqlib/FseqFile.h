@@ -110,6 +110,10 @@ class FseqFile {
   size_t m_blockCapacity = 0;
   std::vector<uint8_t> m_chunk;
   std::vector<uint8_t> m_frame;
+  // Which frame m_frame holds: a player asks for one frame once per
+  // universe it spans, and reading it again each time would cost a whole
+  // frame per universe.
+  uint32_t m_frameHeld = UINT32_MAX;
   struct ZstdContext;
   std::unique_ptr<ZstdContext> m_zstd;
 };
