@@ -9,13 +9,12 @@
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
-#include <deque>
-#include <exception>
 #include <filesystem>
 #include <thread>
 #include <vector>
 
 #include "platform/media/ChildProcess.h"
+#include "platform/media/MediaPlayState.h"
 #include "platform/media/MediaProtocol.h"
 #include "support/Error.h"
 
@@ -87,6 +86,7 @@ struct MediaProcessPlayer::Impl : std::enable_shared_from_this<Impl> {
         outputs(outputs),
         program(std::move(program)),
         timing(timing),
+        plays(loop, log, kSource),
         pingTimer(loop.Context()),
         reapTimer(loop.Context()) {}
 
@@ -105,20 +105,16 @@ struct MediaProcessPlayer::Impl : std::enable_shared_from_this<Impl> {
   void Reap();
   void Close();
 
-  bool Current(uint64_t play) const { return play == generation; }
+  bool Current(uint64_t generation) const { return generation == plays.Generation(); }
   void BeginNewPlay();
-  void SetState(int32_t newState);
   void Fail(const std::string& reason);
-  void NotifyState(int32_t newState);
-  void NotifyError();
-  template <typename Call>
-  void PostToHandler(Call call);
 
   EventLoop& loop;
   MessageLog& log;
   MpvOutputs outputs;
   std::string program;
   MediaProcessTiming timing;
+  MediaPlayState plays;
 
   std::shared_ptr<Link> link;
   asio::steady_timer pingTimer;
@@ -127,16 +123,10 @@ struct MediaProcessPlayer::Impl : std::enable_shared_from_this<Impl> {
   int earlyDeaths = 0;
   SteadyClock::time_point nextStartAllowed{};
 
-  uint64_t generation = 0;
   std::string path;
   std::string mediaType;
-  int32_t state = kMediaStopped;
   MediaClock clock;
   PositionReport latestReport;
-  std::deque<std::string> errors;
-
-  std::function<void(int32_t)> onPlayStateChange;
-  std::function<void()> onMediaError;
 };
 
 // Spawning returns at once: the media process loads libmpv on its own time.
@@ -255,28 +245,23 @@ void MediaProcessPlayer::Impl::Handle(const MediaMessage& message) {
   } else if (const auto* report = std::get_if<media::State>(&message)) {
     if (!Current(report->generation)) return;
     if (report->state == kMediaStopped) clock.Reset();
-    SetState(report->state);
+    plays.SetState(report->state);
   } else if (const auto* type = std::get_if<media::MediaType>(&message)) {
     if (Current(type->generation)) mediaType = type->type;
   } else if (const auto* reported = std::get_if<media::Clock>(&message)) {
-    if (!Current(reported->generation) || state == kMediaStopped) return;
+    if (!Current(reported->generation) || plays.State() == kMediaStopped) return;
     latestReport.clock = {reported->position,
                           MediaClock::TimePoint(std::chrono::nanoseconds(reported->atNs)),
                           reported->end, reported->running};
     latestReport.received = SteadyClock::now();
     clock.Follow(latestReport.clock);
   } else if (const auto* queued = std::get_if<media::QueuedError>(&message)) {
-    errors.push_back(queued->description);
-    while (errors.size() > kMaxQueuedErrors) errors.pop_front();
+    plays.QueueError(queued->description);
   } else if (const auto* failure = std::get_if<media::MediaError>(&message)) {
-    // The state changed before the error was raised, and is raised after it.
-    int32_t before = state;
-    if (Current(failure->generation)) {
-      if (failure->state == kMediaStopped) clock.Reset();
-      state = failure->state;
-    }
-    NotifyError();
-    if (state != before) NotifyState(state);
+    // An error of an earlier play leaves the current one as it is.
+    bool current = Current(failure->generation);
+    if (current && failure->state == kMediaStopped) clock.Reset();
+    plays.RaiseError(current ? failure->state : plays.State());
   } else if (const auto* line = std::get_if<media::Log>(&message)) {
     log.LogMessage(line->level, line->text);
   } else if (const auto* failed = std::get_if<media::Failed>(&message)) {
@@ -343,7 +328,7 @@ void MediaProcessPlayer::Impl::EndLink(const std::string& why, bool kill,
     ending.push_back({gone->processId, false, now + timing.quitWait, line});
   }
   ScheduleReap();
-  if (state != kMediaStopped) Fail(playReason);
+  if (plays.State() != kMediaStopped) Fail(playReason);
 }
 
 void MediaProcessPlayer::Impl::EndLinkUnexpectedly() {
@@ -382,8 +367,7 @@ void MediaProcessPlayer::Impl::Reap() {
 void MediaProcessPlayer::Impl::Close() {
   pingTimer.cancel();
   reapTimer.cancel();
-  onPlayStateChange = nullptr;
-  onMediaError = nullptr;
+  plays.Silence();
   auto now = SteadyClock::now();
   if (link) {
     // Best effort and without waiting: the media process also quits when
@@ -405,53 +389,14 @@ void MediaProcessPlayer::Impl::Close() {
 }
 
 void MediaProcessPlayer::Impl::BeginNewPlay() {
-  ++generation;
+  plays.BeginPlay();
   clock.Reset();
   latestReport = {};
 }
 
-void MediaProcessPlayer::Impl::SetState(int32_t newState) {
-  if (newState == state) return;
-  state = newState;
-  NotifyState(newState);
-}
-
 void MediaProcessPlayer::Impl::Fail(const std::string& reason) {
-  errors.push_back("Cannot play \"" + path + "\": " + reason);
-  while (errors.size() > kMaxQueuedErrors) errors.pop_front();
   clock.Reset();
-  int32_t before = state;
-  state = kMediaStopped;
-  NotifyError();
-  if (before != kMediaStopped) NotifyState(kMediaStopped);
-}
-
-template <typename Call>
-void MediaProcessPlayer::Impl::PostToHandler(Call call) {
-  loop.Post([weak = weak_from_this(), call = std::move(call)] {
-    auto self = weak.lock();
-    if (!self) return;
-    try {
-      call(*self);
-    } catch (const std::exception& e) {
-      self->log.LogMessage(3, std::string("MediaProcessPlayer event handler Error: ") + e.what());
-    }
-  });
-}
-
-void MediaProcessPlayer::Impl::NotifyState(int32_t newState) {
-  PostToHandler([newState, forGeneration = generation](Impl& self) {
-    // Overtaken by OpenMedia or Stop: said only when still true.
-    if (self.generation != forGeneration && self.state != newState) return;
-    // A copy: the handler may replace itself.
-    if (auto handler = self.onPlayStateChange) handler(newState);
-  });
-}
-
-void MediaProcessPlayer::Impl::NotifyError() {
-  PostToHandler([](Impl& self) {
-    if (auto handler = self.onMediaError) handler();
-  });
+  plays.Fail("Cannot play \"" + path + "\": " + reason);
 }
 
 MediaProcessPlayer::MediaProcessPlayer(EventLoop& loop, MessageLog& log, const MpvOutputs& outputs,
@@ -479,7 +424,7 @@ void MediaProcessPlayer::OpenMedia(const std::string& path) {
   p.BeginNewPlay();
   p.path = path;
   p.mediaType.clear();
-  p.SetState(kTransitioning);
+  p.plays.SetState(kTransitioning);
   if (!p.link) {
     auto now = SteadyClock::now();
     if (now < p.nextStartAllowed) {
@@ -494,14 +439,14 @@ void MediaProcessPlayer::OpenMedia(const std::string& path) {
       return;
     }
   }
-  p.Send(media::Open{p.generation, path});
+  p.Send(media::Open{p.plays.Generation(), path});
 }
 
 void MediaProcessPlayer::Stop() {
   Impl& p = *m_impl;
   p.BeginNewPlay();
-  p.Send(media::Stop{p.generation});
-  p.SetState(kMediaStopped);
+  p.Send(media::Stop{p.plays.Generation()});
+  p.plays.SetState(kMediaStopped);
 }
 
 std::string MediaProcessPlayer::CurrentMediaItemInfo(const std::string& attribute) const {
@@ -515,7 +460,7 @@ double MediaProcessPlayer::CurrentPosition() const {
 }
 
 int32_t MediaProcessPlayer::PlayState() const {
-  return m_impl->state;
+  return m_impl->plays.State();
 }
 
 void MediaProcessPlayer::SetFullScreen(bool value) {
@@ -523,18 +468,15 @@ void MediaProcessPlayer::SetFullScreen(bool value) {
 }
 
 int32_t MediaProcessPlayer::ErrorCount() const {
-  return static_cast<int32_t>(m_impl->errors.size());
+  return m_impl->plays.ErrorCount();
 }
 
 std::string MediaProcessPlayer::ErrorDescription(int32_t index) const {
-  if (index < 0 || index >= ErrorCount()) {
-    throw errors::SubscriptOutOfRange(std::string(kSource) + ".ErrorDescription");
-  }
-  return m_impl->errors[static_cast<size_t>(index)];
+  return m_impl->plays.ErrorDescription(index);
 }
 
 void MediaProcessPlayer::ClearErrorQueue() {
-  m_impl->errors.clear();
+  m_impl->plays.ClearErrorQueue();
 }
 
 void MediaProcessPlayer::ShowVideoForm(int32_t x, int32_t y) {
@@ -546,11 +488,11 @@ void MediaProcessPlayer::HideVideoForm() {
 }
 
 void MediaProcessPlayer::SetOnPlayStateChange(std::function<void(int32_t)> handler) {
-  m_impl->onPlayStateChange = std::move(handler);
+  m_impl->plays.SetOnPlayStateChange(std::move(handler));
 }
 
 void MediaProcessPlayer::SetOnMediaError(std::function<void()> handler) {
-  m_impl->onMediaError = std::move(handler);
+  m_impl->plays.SetOnMediaError(std::move(handler));
 }
 
 int64_t MediaProcessPlayer::ProcessId() const {

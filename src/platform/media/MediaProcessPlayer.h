@@ -14,8 +14,8 @@
 // OpenMedia moves to transitioning (9) at once, then playing (3), then
 // stopped (1) once the media has finished sounding. PlayStateChange and
 // MediaError are raised on the loop, never from inside a call made on this
-// object; a play-state change that OpenMedia or Stop overtook before it was
-// raised is raised only if it is still true.
+// object; each change raised holds for the play asked for last
+// (MediaPlayState).
 //
 // The media process is started with this object (posix_spawn: the loop does
 // not wait for it) and pinged every MediaProcessTiming::pingInterval. When it
@@ -40,6 +40,7 @@
 
 #include "platform/EventLoop.h"
 #include "platform/media/MediaClock.h"
+#include "platform/media/MediaPlayState.h"
 #include "platform/media/MpvOutputs.h"
 #include "ports/MessageLog.h"
 #include "show/MediaPlayer.h"
@@ -63,8 +64,7 @@ struct MediaProcessTiming {
 
 class MediaProcessPlayer : public MediaPlayer {
  public:
-  static constexpr int32_t kTransitioning = 9;
-  static constexpr size_t kMaxQueuedErrors = 100;
+  static constexpr int32_t kTransitioning = kMediaTransitioning;
   // The media process's program: named by this environment variable, else
   // this name in the folder of the running program.
   static constexpr const char* kProgramVariable = "TAV_MEDIA_HELPER";

@@ -3,10 +3,9 @@
 // sequences. OpenMedia replaces whatever plays and starts the file; the play
 // state goes to transitioning (9), then playing (3) once sound (or picture)
 // starts, and stopped (1) when the media has finished sounding, when Stop is
-// called, or when the file cannot be played. A play-state change that
-// OpenMedia or Stop overtook before it was raised is raised only if it is
-// still true, so each change raised holds for the play asked for last. The
-// position runs smoothly between mpv's reports (MediaClock).
+// called, or when the file cannot be played. Each change raised holds for
+// the play asked for last (MediaPlayState). The position runs smoothly
+// between mpv's reports (MediaClock).
 //
 // Threads: mpv runs its own threads, which touch nothing of ours but a
 // wakeup flag: its wakeup callback only posts a drain to the event loop, and
@@ -35,6 +34,7 @@
 
 #include "platform/EventLoop.h"
 #include "platform/media/MediaClock.h"
+#include "platform/media/MediaPlayState.h"
 #include "platform/media/MpvOutputs.h"
 #include "ports/MessageLog.h"
 #include "show/MediaPlayer.h"
@@ -43,10 +43,7 @@ namespace tav {
 
 class MpvMediaPlayer : public MediaPlayer {
  public:
-  // The play state between OpenMedia and the start of playback.
-  static constexpr int32_t kTransitioning = 9;
-  // The error queue keeps the latest this many descriptions.
-  static constexpr size_t kMaxQueuedErrors = 100;
+  static constexpr int32_t kTransitioning = kMediaTransitioning;
 
   // Starts mpv with the given outputs. Fails with kMediaPlayerUnavailable
   // when mpv cannot be started.
