@@ -3,7 +3,6 @@
 #include <deque>
 #include <exception>
 
-#include "show/MediaPlayer.h"
 #include "support/Error.h"
 
 namespace tav {
@@ -31,7 +30,6 @@ struct MediaPlayState::Shared {
   MessageLog& log;
   std::string source;
   uint64_t generation = 0;
-  uint64_t changedIn = 0;  // the generation of the latest state change
   int32_t state = kMediaStopped;
   std::deque<std::string> errors;
   std::function<void(int32_t)> onPlayStateChange;
@@ -62,12 +60,10 @@ void MediaPlayState::SetState(int32_t newState) {
 }
 
 void MediaPlayState::RaiseState(int32_t newState) {
-  m_shared->changedIn = m_shared->generation;
   m_shared->Raise(m_shared, [newState, forGeneration = m_shared->generation](Shared& shared) {
-    // Overtaken by a newer play: said only when still true and the newer
-    // play has no change of its own to say.
-    bool overtaken = shared.generation != forGeneration;
-    if (overtaken && (shared.state != newState || shared.changedIn == shared.generation)) return;
+    // Overtaken by OpenMedia or Stop: said only when still true.
+    if (shared.generation != forGeneration && shared.state != newState) return;
+    // A copy: the handler may replace itself.
     if (auto handler = shared.onPlayStateChange) handler(newState);
   });
 }

@@ -8,9 +8,8 @@
 //
 // Events are raised on the loop, never from inside a call; a handler may
 // destroy the owner. A play-state change that a newer play overtook before it
-// was raised is dropped, unless it is still true and the newer play has
-// changed nothing itself, so every change raised holds for the play asked
-// for last, and none is said twice.
+// was raised is raised only if it is still true, so every change raised
+// holds for the play asked for last.
 //
 // Owned by the adapter; the EventLoop and the MessageLog must outlive it.
 // Events not yet raised when it goes are dropped.
@@ -22,11 +21,9 @@
 
 #include "platform/EventLoop.h"
 #include "ports/MessageLog.h"
+#include "show/MediaPlayer.h"
 
 namespace tav {
-
-// The play state between OpenMedia and the start of playback.
-inline constexpr int32_t kMediaTransitioning = 9;
 
 class MediaPlayState {
  public:

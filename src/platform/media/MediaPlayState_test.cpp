@@ -54,19 +54,45 @@ TEST_F(MediaPlayStateTest, EventsComeFromTheLoopInOrderAndAFailureStopsBeforeIts
 }
 
 TEST_F(MediaPlayStateTest, AChangeANewerPlayOvertookIsRaisedOnlyIfStillTrue) {
-  plays->BeginPlay();
-  plays->SetState(kMediaTransitioning);
-  plays->SetState(kMediaPlaying);  // false by the time it would be raised
-  EXPECT_EQ(plays->BeginPlay(), 2u);
-  plays->SetState(kMediaTransitioning);
-  EXPECT_EQ(Raise(), (Raised{"state 9"}));
+  constexpr int32_t kNewPlay = 0;  // OpenMedia or Stop begins the next play
+  struct Case {
+    const char* what;
+    std::vector<int32_t> steps;  // states set, and kNewPlay
+    Raised expected;
+  };
+  const Case cases[] = {
+      {"the current play's changes all come",
+       {kNewPlay, 9, 3, 1},
+       {"state 9", "state 3", "state 1"}},
+      {"stopped before it was heard to start", {kNewPlay, 9, 3, kNewPlay, 1}, {"state 1"}},
+      {"opened again while opening", {kNewPlay, 9, kNewPlay, 9}, {"state 9"}},
+      {"a play that failed, then the next",
+       {kNewPlay, 9, 1, kNewPlay, 9, 3},
+       {"state 9", "state 3"}},
+  };
+  for (const Case& c : cases) {
+    SCOPED_TRACE(c.what);
+    uint64_t generation = plays->Generation();
+    for (int32_t step : c.steps) {
+      if (step == kNewPlay) {
+        EXPECT_EQ(plays->BeginPlay(), ++generation);
+      } else {
+        plays->SetState(step);
+      }
+    }
+    EXPECT_EQ(Raise(), c.expected);
+    plays->SetState(kMediaStopped);
+    Raise();
+  }
 
-  plays->SetState(kMediaPlaying);
+  // A change that is still true is said even though a newer play overtook it.
   plays->BeginPlay();
+  plays->SetState(kMediaPlaying);
+  Raise();
   plays->SetState(kMediaStopped);
   plays->BeginPlay();
-  plays->SetState(kMediaTransitioning);
-  EXPECT_EQ(Raise(), (Raised{"state 9"}));
+  plays->SetState(kMediaStopped);
+  EXPECT_EQ(Raise(), (Raised{"state 1"}));
 }
 
 TEST_F(MediaPlayStateTest, TheErrorQueueKeepsTheLatestAndRefusesWhatIsOutside) {
@@ -89,10 +115,14 @@ TEST_F(MediaPlayStateTest, TheErrorQueueKeepsTheLatestAndRefusesWhatIsOutside) {
 
 TEST_F(MediaPlayStateTest, AHandlerMayEndTheOwnerAndWhatFailsInOneIsLogged) {
   plays->SetOnMediaError([] { throw std::runtime_error("boom"); });
-  plays->SetOnPlayStateChange([this](int32_t) { plays.reset(); });
+  plays->SetOnPlayStateChange([this](int32_t state) {
+    raised.push_back("state " + std::to_string(state));
+    plays.reset();
+  });
   plays->Fail("x");
   plays->SetState(kMediaPlaying);
-  EXPECT_EQ(Raise(), Raised{});
+  plays->SetState(kMediaStopped);  // on its way when the owner goes: dropped
+  EXPECT_EQ(Raise(), Raised{"state 3"});
   EXPECT_FALSE(plays);
   EXPECT_EQ(log.lines, Raised{"3 Player event handler Error: boom"});
 }
