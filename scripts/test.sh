@@ -11,6 +11,7 @@ cmake --build build/dev -j "$(nproc)"
 ctest --preset dev -j "$(nproc)" | tee build/dev/ctest.log
 # Outputs against independent receivers; says "skipped" where it cannot run.
 SHOWCTL=build/dev/apps/showctl/showctl bash scripts/e2e-outputs.sh
+bash scripts/e2e-player.sh build/dev
 bash scripts/fuzz.sh
 fuzzed=$(ls build/fuzz/fuzz/fuzz_* 2>/dev/null | grep -c . || true)
 passed=$(sed -n 's/.* tests passed, 0 tests failed out of \([0-9]*\)$/\1/p' build/dev/ctest.log)

@@ -14,31 +14,36 @@ std::string PlayTypeName(int32_t playType) {
   return "(" + std::to_string(playType) + ")";
 }
 
-std::string ComposeLogLine(DateTime now, std::string_view szText, const SequenceIdentity* seqInfo) {
-  std::string line = now.TimeText();
-  line += ": ";
-  line.append(szText);
+std::string ComposeLogText(std::string_view szText, const SequenceIdentity* seqInfo) {
+  std::string text(szText);
   if (seqInfo != nullptr) {
-    line += ' ';
-    line += PlayTypeName(seqInfo->PlayType());
-    line += ": ";
-    line += seqInfo->Filename();
+    text += ' ';
+    text += PlayTypeName(seqInfo->PlayType());
+    text += ": ";
+    text += seqInfo->Filename();
   }
-  return line;
+  return text;
+}
+
+std::string ComposeLogLine(DateTime now, std::string_view szText, const SequenceIdentity* seqInfo) {
+  return now.TimeText() + ": " + ComposeLogText(szText, seqInfo);
 }
 
 void HostLog::LogMessage(int32_t level, const std::string& szText,
                          const SequenceIdentity* seqInfo) {
   if (szText.empty()) return;
   try {
-    std::string line = ComposeLogLine(m_clock.Now(), szText, seqInfo);
+    DateTime now = m_clock.Now();
+    std::string text = ComposeLogText(szText, seqInfo);
     if (level <= 0) return;
+    std::string line = now.TimeText() + ": " + text;
     if (m_outbox.TrayWindow() != 0) {
       FlushPendingLog();
       m_outbox.Send(kMsgLogText, line);
     } else {
       m_pendingLog.Append(line);
     }
+    if (m_echo) m_echo(level, now, text);
   } catch (...) {
     // Logging must never disturb the caller; the line is lost.
   }

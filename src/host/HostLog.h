@@ -7,9 +7,12 @@
 // composed and discarded.
 //
 // Owned by the host; takes the clock for the time of day and the outbox that
-// knows the tray window. Logging never fails towards the caller.
+// knows the tray window. Logging never fails towards the caller. An echo,
+// when set, sees every line that is not a trace line as well (the player
+// copies lines to standard error while no tray is connected).
 
 #include <cstdint>
+#include <functional>
 #include <string>
 #include <string_view>
 
@@ -23,8 +26,11 @@ namespace tav {
 // "Null", "Background", ... "Shutdown" for 0 to 7; "(n)" for any other n.
 std::string PlayTypeName(int32_t playType);
 
-// The log line for `szText` at the time of day of `now`.
+// The log line for `szText` at the time of day of `now`: the time, ": " and
+// the text of ComposeLogText.
 std::string ComposeLogLine(DateTime now, std::string_view szText, const SequenceIdentity* seqInfo);
+// `szText` and, for a sequence, " ", its play-type name, ": " and its file.
+std::string ComposeLogText(std::string_view szText, const SequenceIdentity* seqInfo);
 
 class HostLog : public MessageLog {
  public:
@@ -38,10 +44,16 @@ class HostLog : public MessageLog {
 
   const PendingLog& Pending() const { return m_pendingLog; }
 
+  // Called with the level, the time and the text (without the time) of
+  // every line of level 1 or more, after it went to the tray or the buffer.
+  using Echo = std::function<void(int32_t level, DateTime now, const std::string& text)>;
+  void SetEcho(Echo echo) { m_echo = std::move(echo); }
+
  private:
   const Clock& m_clock;
   TrayOutbox& m_outbox;
   PendingLog m_pendingLog;
+  Echo m_echo;
 };
 
 }  // namespace tav

@@ -120,5 +120,21 @@ TEST_F(HostLogTest, LinesToAVanishedTrayAreLostWithoutFailing) {
   EXPECT_TRUE(tray.Received().empty());
 }
 
+TEST_F(HostLogTest, EchoSeesEveryLineButTraceWithItsLevelAndWithoutTheTime) {
+  std::vector<std::string> echoed;
+  log.SetEcho([&](int32_t level, DateTime now, const std::string& text) {
+    echoed.push_back(std::to_string(level) + " " + now.ToText() + " " + text);
+  });
+  FakeSequence seq;
+  log.LogMessage(0, "Queueing", &seq);
+  log.LogMessage(1, "Starting", &seq);
+  auto& tray = link.Connect();
+  outbox.Retarget(tray.Handle());
+  log.LogMessage(3, "Cannot read show file: x");
+  EXPECT_EQ(echoed,
+            (std::vector<std::string>{"1 2024-12-24 18:00:00 Starting Background: Intro.tsq",
+                                      "3 2024-12-24 18:00:00 Cannot read show file: x"}));
+}
+
 }  // namespace
 }  // namespace tav

@@ -9,7 +9,8 @@
 
 namespace tav {
 
-// Puts the calling thread at SCHED_FIFO `priority` (1-99). "" on success,
+// Puts the calling thread at SCHED_FIFO `priority` (1-99); processes and
+// threads it makes afterwards start at normal priority. "" on success,
 // otherwise the reason it was refused.
 std::string RequestRealtimePriority(int priority);
 
