@@ -30,6 +30,7 @@ using namespace std::chrono_literals;
 using SteadyClock = std::chrono::steady_clock;
 
 constexpr int32_t kTransitioning = MediaProcessPlayer::kTransitioning;
+constexpr const char* kSilent = "; playing on without sound";
 const MpvOutputs kNullOutputs{"null", "", "null"};
 
 class MediaProcessTest : public ::testing::Test {
@@ -47,7 +48,6 @@ class MediaProcessTest : public ::testing::Test {
     });
     player->SetOnMediaError([this] {
       EXPECT_FALSE(insideCall) << "MediaError raised inside a call";
-      EXPECT_EQ(player->PlayState(), kMediaStopped);
       ++mediaErrors;
       events.push_back("error");
     });
@@ -199,25 +199,32 @@ TEST_F(MediaProcessTest, ASoundDeviceThatCannotOpenIsSaidOnceInThePlayersLog) {
                            "alsa/tav-no-such-device); playing without sound"}));
 }
 
-TEST_F(MediaProcessTest, AMediaProcessKilledMidPlayEndsThePlayAndTheNextOpenStartsAnother) {
+TEST_F(MediaProcessTest, AMediaProcessKilledMidPlayLeavesThePlayRunningSilentlyToItsEnd) {
   Make();
-  std::string tone = folder.Write("tone.wav", ToneWav(2.0));
+  std::string tone = folder.Write("tone.wav", ToneWav(1.5));
   Open(tone);
-  ASSERT_TRUE(RunUntil([&] { return Saw(kMediaPlaying); }));
+  ASSERT_TRUE(RunUntil([&] { return Saw(kMediaPlaying) && player->CurrentPosition() > 0.2; }));
   int64_t first = player->ProcessId();
   ::kill(static_cast<pid_t>(first), SIGKILL);
 
+  // RunUntil also watches that the position never goes back.
   ASSERT_TRUE(RunUntil([&] { return mediaErrors == 1 && !log.lines.empty(); }));
-  EXPECT_EQ(player->PlayState(), kMediaStopped);
-  EXPECT_EQ(player->CurrentPosition(), 0.0);
-  EXPECT_EQ(states, (std::vector<int32_t>{kTransitioning, kMediaPlaying, kMediaStopped}));
+  EXPECT_EQ(player->PlayState(), kMediaPlaying);
+  EXPECT_GT(player->CurrentPosition(), 0.2) << "the play started again";
   ASSERT_EQ(player->ErrorCount(), 1);
   EXPECT_EQ(player->ErrorDescription(0),
-            "Cannot play \"" + tone + "\": the media process ended unexpectedly");
+            "Cannot play \"" + tone + "\": the media process ended unexpectedly" + kSilent);
   EXPECT_EQ(log.lines, (std::vector<std::string>{
                            "3 Media: the media process ended unexpectedly (killed by signal 9 "
                            "(Killed)); the next media file starts a new one"}));
   EXPECT_EQ(player->ProcessId(), 0);
+
+  ASSERT_TRUE(RunUntil([&] { return Saw(kMediaStopped); }));
+  EXPECT_EQ(states, (std::vector<int32_t>{kTransitioning, kMediaPlaying, kMediaStopped}));
+  EXPECT_GT(positionSeen, 1.4) << "stopped before the media's end";
+  EXPECT_LE(positionSeen, 1.5) << "ran beyond the media's end";
+  EXPECT_EQ(player->CurrentPosition(), 0.0);
+  EXPECT_EQ(mediaErrors, 1);
 
   Forget();
   Open(tone);
@@ -344,11 +351,11 @@ TEST_F(MediaProcessTest, AMediaProcessThatSaysWhatCannotBeReadIsEnded) {
     Forget();
     Open("/a.mp3");
     ASSERT_TRUE(RunUntil([&] { return mediaErrors > 0 && !log.lines.empty(); }));
-    EXPECT_EQ(player->PlayState(), kMediaStopped);
+    EXPECT_EQ(player->PlayState(), kMediaPlaying);
     EXPECT_EQ(log.lines, std::vector<std::string>{"3 Media: the media process " + c.logged +
                                                   "; the next media file starts a new one"});
     ASSERT_EQ(player->ErrorCount(), 1);
-    EXPECT_EQ(player->ErrorDescription(0), "Cannot play \"/a.mp3\": " + c.queued);
+    EXPECT_EQ(player->ErrorDescription(0), "Cannot play \"/a.mp3\": " + c.queued + kSilent);
   }
 }
 
@@ -365,7 +372,7 @@ TEST_F(MediaProcessTest, AMediaProcessThatStopsAnsweringIsEndedAndTheNextOpenSta
   Open("/a.mp3");
   ASSERT_TRUE(RunUntil([&] { return mediaErrors == 1; }));
   EXPECT_GE(SteadyClock::now() - opened, 250ms) << "ended before the bound";
-  EXPECT_EQ(player->PlayState(), kMediaStopped);
+  EXPECT_EQ(player->PlayState(), kMediaPlaying);
   EXPECT_EQ(log.lines, (std::vector<std::string>{"3 Media: the media process did not answer "
                                                  "within 300 ms and was ended; the next media "
                                                  "file starts a new one"}));
@@ -396,7 +403,8 @@ TEST_F(MediaProcessTest, AMediaProcessThatDiesAtOnceIsStartedAgainOnlyAfterABack
   ASSERT_TRUE(RunUntil([&] { return mediaErrors == 2; }));
   EXPECT_EQ(player->ErrorDescription(1),
             "Cannot play \"/b.mp3\": the media process keeps ending unexpectedly; it is tried "
-            "again in 1 s");
+            "again in 1 s" +
+                std::string(kSilent));
   EXPECT_EQ(folder.Read("starts"), "x\nx\n");
 
   RunUntil([] { return false; }, 450ms);
@@ -406,14 +414,31 @@ TEST_F(MediaProcessTest, AMediaProcessThatDiesAtOnceIsStartedAgainOnlyAfterABack
   EXPECT_EQ(log.lines, (std::vector<std::string>{died, died, died}));
 }
 
-TEST_F(MediaProcessTest, AProgramThatIsNotThereMeansNoMediaPlayer) {
-  try {
-    Make(folder / "no-such-program");
-    FAIL() << "made";
-  } catch (const Error& e) {
-    EXPECT_EQ(e.Number(), kMediaPlayerUnavailable);
-    EXPECT_NE(e.Description().find("no-such-program"), std::string::npos);
-  }
+TEST_F(MediaProcessTest, WithoutItsProgramEachFilePlaysSilentlyUntilTheProgramIsThere) {
+  std::string program = folder / "showplayer-media";
+  Make(program);
+  EXPECT_EQ(log.lines, std::vector<std::string>{
+                           "3 Media: cannot start the media process " + program +
+                           ": No such file or directory; music and video play without sound "
+                           "until it starts, and each media file tries again"});
+  Forget();
+  Open("/a.mp3");
+  EXPECT_EQ(player->PlayState(), kMediaPlaying);
+  ASSERT_TRUE(RunUntil([&] { return player->CurrentPosition() > 0.05; }));
+  EXPECT_EQ(events, (std::vector<std::string>{"state 9", "error", "state 3"}));
+  ASSERT_EQ(player->ErrorCount(), 1);
+  EXPECT_EQ(player->ErrorDescription(0), "Cannot play \"/a.mp3\": cannot start the media process " +
+                                             program + ": No such file or directory" + kSilent);
+  EXPECT_TRUE(log.lines.empty()) << "said again for each file";
+  player->Stop();
+  EXPECT_EQ(player->CurrentPosition(), 0.0);
+
+  Fake("showplayer-media", "    open) say state $2 3 ;;");
+  Forget();
+  Open("/b.mp3");
+  EXPECT_NE(player->ProcessId(), 0);
+  ASSERT_TRUE(RunUntil([&] { return Saw(kMediaPlaying); }));
+  EXPECT_EQ(mediaErrors, 0);
 }
 
 }  // namespace

@@ -10,6 +10,7 @@
 #include <cstdlib>
 #include <cstring>
 #include <filesystem>
+#include <optional>
 #include <thread>
 #include <vector>
 
@@ -24,6 +25,7 @@ namespace {
 constexpr const char* kSource = "MediaProcessPlayer";
 constexpr const char* kEndedUnexpectedly = "the media process ended unexpectedly";
 constexpr const char* kLogTail = "; the next media file starts a new one";
+constexpr const char* kSilentTail = "; playing on without sound";
 // The media process's end of the socket pair, as its command line says.
 constexpr int kChildSocket = 3;
 // What may wait for a media process that does not read before it counts as
@@ -34,6 +36,10 @@ constexpr auto kReapPoll = std::chrono::milliseconds(10);
 
 using SteadyClock = std::chrono::steady_clock;
 using Socket = asio::local::stream_protocol::socket;
+
+SteadyClock::duration Seconds(double seconds) {
+  return std::chrono::duration_cast<SteadyClock::duration>(std::chrono::duration<double>(seconds));
+}
 
 std::string DurationText(SteadyClock::duration duration) {
   auto ms = std::chrono::duration_cast<std::chrono::milliseconds>(duration).count();
@@ -88,7 +94,8 @@ struct MediaProcessPlayer::Impl : std::enable_shared_from_this<Impl> {
         timing(timing),
         plays(loop, log, kSource),
         pingTimer(loop.Context()),
-        reapTimer(loop.Context()) {}
+        reapTimer(loop.Context()),
+        silentEnd(loop.Context()) {}
 
   void Start();
   void Send(const MediaMessage& message);
@@ -107,7 +114,8 @@ struct MediaProcessPlayer::Impl : std::enable_shared_from_this<Impl> {
 
   bool Current(uint64_t generation) const { return generation == plays.Generation(); }
   void BeginNewPlay();
-  void Fail(const std::string& reason);
+  void PlayOnInSilence(const std::string& reason);
+  double Position(SteadyClock::time_point now) const;
 
   EventLoop& loop;
   MessageLog& log;
@@ -127,10 +135,26 @@ struct MediaProcessPlayer::Impl : std::enable_shared_from_this<Impl> {
   std::string mediaType;
   MediaClock clock;
   PositionReport latestReport;
+
+  // A play that has no media process: its position runs on the steady
+  // clock from `from` at `since`, up to `end` when the media's length is
+  // known (0: unknown), when it stops as the music would have.
+  struct SilentPlay {
+    double from = 0;
+    SteadyClock::time_point since;
+    double end = 0;
+  };
+  std::optional<SilentPlay> silent;
+  asio::steady_timer silentEnd;
 };
 
 // Spawning returns at once: the media process loads libmpv on its own time.
 void MediaProcessPlayer::Impl::Start() {
+  if (::access(program.c_str(), X_OK) != 0) {
+    std::string reason = std::strerror(errno);
+    throw Error(kMediaPlayerUnavailable, kSource,
+                "cannot start the media process " + program + ": " + reason);
+  }
   SpawnedChild child =
       SpawnWithSocket(program, {"--fd", std::to_string(kChildSocket)}, kChildSocket);
   auto fresh = std::make_shared<Link>(loop.Context());
@@ -328,7 +352,7 @@ void MediaProcessPlayer::Impl::EndLink(const std::string& why, bool kill,
     ending.push_back({gone->processId, false, now + timing.quitWait, line});
   }
   ScheduleReap();
-  if (plays.State() != kMediaStopped) Fail(playReason);
+  if (plays.State() != kMediaStopped) PlayOnInSilence(playReason);
 }
 
 void MediaProcessPlayer::Impl::EndLinkUnexpectedly() {
@@ -367,6 +391,7 @@ void MediaProcessPlayer::Impl::Reap() {
 void MediaProcessPlayer::Impl::Close() {
   pingTimer.cancel();
   reapTimer.cancel();
+  silentEnd.cancel();
   plays.Silence();
   auto now = SteadyClock::now();
   if (link) {
@@ -392,26 +417,56 @@ void MediaProcessPlayer::Impl::BeginNewPlay() {
   plays.BeginPlay();
   clock.Reset();
   latestReport = {};
+  silent.reset();
+  silentEnd.cancel();
 }
 
-void MediaProcessPlayer::Impl::Fail(const std::string& reason) {
+// The music is lost, not the show: the play goes on from where it stood,
+// so that the lights bound to it keep their time, and ends at the media's
+// end as the music would have (or when the engine stops it). Said through
+// the error queue and the media error, as a file that cannot be played is.
+void MediaProcessPlayer::Impl::PlayOnInSilence(const std::string& reason) {
+  auto now = SteadyClock::now();
+  double from = clock.Position(now);
+  double end = clock.Take().end;
   clock.Reset();
-  plays.Fail("Cannot play \"" + path + "\": " + reason);
+  plays.QueueError("Cannot play \"" + path + "\": " + reason + kSilentTail);
+  if (end > 0 && from >= end) {
+    plays.RaiseError(kMediaStopped);  // it had been heard to its end
+    return;
+  }
+  silent = SilentPlay{from, now, end};
+  plays.RaiseError(kMediaPlaying);
+  if (end <= 0) return;
+  silentEnd.expires_after(Seconds(end - from));
+  silentEnd.async_wait(
+      [weak = weak_from_this(), forGeneration = plays.Generation()](const asio::error_code& error) {
+        auto self = weak.lock();
+        if (error || !self || self->plays.Generation() != forGeneration) return;
+        self->silent.reset();
+        self->plays.SetState(kMediaStopped);
+      });
+}
+
+double MediaProcessPlayer::Impl::Position(SteadyClock::time_point now) const {
+  if (!silent) return clock.Position(now);
+  double position = silent->from + std::chrono::duration<double>(
+                                       std::max(now - silent->since, SteadyClock::duration::zero()))
+                                       .count();
+  return silent->end > 0 ? std::min(position, silent->end) : position;
 }
 
 MediaProcessPlayer::MediaProcessPlayer(EventLoop& loop, MessageLog& log, const MpvOutputs& outputs,
                                        const std::string& program, const MediaProcessTiming& timing)
     : m_impl(std::make_shared<Impl>(loop, log, outputs, program, timing)) {
-  if (::access(program.c_str(), X_OK) != 0) {
-    std::string reason = std::strerror(errno);
-    throw Error(kMediaPlayerUnavailable, kSource,
-                "Cannot start the media player: " + program + ": " + reason);
-  }
   try {
     m_impl->Start();
   } catch (const Error& e) {
-    throw Error(kMediaPlayerUnavailable, kSource,
-                "Cannot start the media player: " + e.Description());
+    // The lights need no media process: the shows go on, and each media
+    // file tries to start one again.
+    log.LogMessage(3, "Media: " + e.Description() +
+                          "; music and video play without sound until it starts, and each "
+                          "media file tries again");
   }
 }
 
@@ -428,14 +483,15 @@ void MediaProcessPlayer::OpenMedia(const std::string& path) {
   if (!p.link) {
     auto now = SteadyClock::now();
     if (now < p.nextStartAllowed) {
-      p.Fail("the media process keeps ending unexpectedly; it is tried again in " +
-             DurationText(std::chrono::ceil<std::chrono::seconds>(p.nextStartAllowed - now)));
+      p.PlayOnInSilence(
+          "the media process keeps ending unexpectedly; it is tried again in " +
+          DurationText(std::chrono::ceil<std::chrono::seconds>(p.nextStartAllowed - now)));
       return;
     }
     try {
       p.Start();
     } catch (const Error& e) {
-      p.Fail(e.Description());
+      p.PlayOnInSilence(e.Description());
       return;
     }
   }
@@ -456,7 +512,7 @@ std::string MediaProcessPlayer::CurrentMediaItemInfo(const std::string& attribut
 }
 
 double MediaProcessPlayer::CurrentPosition() const {
-  return m_impl->clock.Position(SteadyClock::now());
+  return m_impl->Position(SteadyClock::now());
 }
 
 int32_t MediaProcessPlayer::PlayState() const {

@@ -20,12 +20,17 @@
 // The media process is started with this object (posix_spawn: the loop does
 // not wait for it) and pinged every MediaProcessTiming::pingInterval. When it
 // ends, writes what cannot be read, or leaves a ping unanswered for
-// answerBound, it is ended, one line is logged, and a play that was going
-// ends with a media error ("the media process ended unexpectedly") and the
-// stopped state. The next OpenMedia starts a new one. After a second early
-// death in a row, OpenMedia fails at once until a back-off has passed that
-// doubles with each further early death, so that a media process that cannot
-// start does not spin.
+// answerBound, it is ended and one line is logged. The music is lost, not
+// the show: a play that was going plays on without sound, its position
+// running on the steady clock from where it stood to the media's end (then
+// stopped, as if heard to its end), so the lights bound to it keep their
+// time; a media error says why ("the media process ended unexpectedly;
+// playing on without sound"). The next OpenMedia starts a new media process;
+// one that cannot have one (the program is missing, cannot start, or is in
+// its back-off) plays on without sound in the same way, from 0 and without
+// end until Stop. After a second early death in a row, OpenMedia does not
+// start one until a back-off has passed that doubles with each further early
+// death, so that a media process that cannot start does not spin.
 //
 // Owned by the composition root; the EventLoop and the MessageLog must
 // outlive it. Used on the loop's thread only. Destroying it closes the link
@@ -71,9 +76,9 @@ class MediaProcessPlayer : public MediaPlayer {
   static constexpr const char* kProgramName = "showplayer-media";
   static std::string DefaultProgramPath();
 
-  // Starts the media process `program` with the given outputs. Fails with
-  // kMediaPlayerUnavailable when the program is not an executable file or
-  // cannot be started.
+  // Starts the media process `program` with the given outputs. A program
+  // that is missing or cannot start is logged, not raised: each OpenMedia
+  // tries again.
   MediaProcessPlayer(EventLoop& loop, MessageLog& log, const MpvOutputs& outputs,
                      const std::string& program, const MediaProcessTiming& timing = {});
   ~MediaProcessPlayer() override;
