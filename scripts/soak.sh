@@ -19,9 +19,10 @@ repo=$(pwd)
 minutes=${1:-30}
 build=${BUILD_DIR:-build/release}
 
-if [ ! -x "$build/apps/showplayer/showplayer" ] || [ ! -x "$build/apps/showctl/showctl" ]; then
+if [ ! -x "$build/apps/showplayer/showplayer" ] || [ ! -x "$build/apps/showplayer/showplayer-media" ] ||
+    [ ! -x "$build/apps/showctl/showctl" ]; then
   cmake --preset "$(basename "$build")" >/dev/null
-  cmake --build "$build" --target showplayer showctl
+  cmake --build "$build" --target showplayer showplayer-media showctl
 fi
 showplayer="$repo/$build/apps/showplayer/showplayer"
 showctl="$repo/$build/apps/showctl/showctl"
