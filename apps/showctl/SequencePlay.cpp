@@ -23,17 +23,13 @@
 #include "platform/AsioTimerService.h"
 #include "platform/EventLoop.h"
 #include "platform/FileRegistryStore.h"
+#include "platform/LocalChannelIO.h"
 #include "platform/LocalFileSystem.h"
-#include "platform/LockFileOutputClaim.h"
 #include "platform/PlatformPaths.h"
-#include "platform/PosixSerialPort.h"
 #include "platform/Realtime.h"
 #include "platform/SystemClock.h"
-#include "platform/TimerfdDeadlineTimer.h"
-#include "platform/UdpDatagramNetwork.h"
 #include "suite/channelio/ChannelIOControl.h"
 #include "suite/channelio/LevelViewDriver.h"
-#include "suite/channelio/serial/SerialOutputs.h"
 #include "suite/seqlib/FileSequenceLibrary.h"
 #include "suite/seqlib/PlayEvent.h"
 #include "support/Error.h"
@@ -177,26 +173,9 @@ int Play(const PlayOptions& o, const std::string& folder) {
   }
 
   StderrLog log(o.quiet);
-  UdpDatagramNetwork network(loop);
-  TimerfdDeadlineTimer frameTimer(loop);
-  LockFileOutputClaim claim;
-  ChannelIOPorts ports;
-  ports.clock = clock.get();
-  ports.timer = &frameTimer;
-  ports.network = &network;
-  ports.log = &log;
-  ports.settings = &store;
-  ports.claim = &claim;
   AsioTimerService timers(loop);
-  PosixSerialPorts serialPorts(loop);
-  ChannelIOControl* controlForInputs = nullptr;
-  SerialOutputs serial({&serialPorts, &timers, clock.get(), &log},
-                       [&controlForInputs](int32_t network, int32_t unit, int32_t input) {
-                         if (controlForInputs) controlForInputs->InjectInput(network, unit, input);
-                       });
-  ports.serial = &serial;
-  ChannelIOControl control(ports);
-  controlForInputs = &control;
+  LocalChannelIO channelIO(loop, *clock, timers, log, store);
+  ChannelIOControl& control = *channelIO.Control();
   control.ApplyNetworkPreferences(prefs);
   control.SetupClient(true, "showctl sequence play", true);
 

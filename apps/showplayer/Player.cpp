@@ -16,22 +16,18 @@
 #include "platform/FileRegistryStore.h"
 #include "platform/InstanceLock.h"
 #include "platform/LinuxProcessMemory.h"
+#include "platform/LocalChannelIO.h"
 #include "platform/LocalFileSystem.h"
 #include "platform/LocalTextFiles.h"
-#include "platform/LockFileOutputClaim.h"
 #include "platform/PlatformPaths.h"
 #include "platform/PosixFiles.h"
 #include "platform/PosixProcessSpawner.h"
-#include "platform/PosixSerialPort.h"
 #include "platform/Realtime.h"
 #include "platform/SystemClock.h"
-#include "platform/TimerfdDeadlineTimer.h"
-#include "platform/UdpDatagramNetwork.h"
 #include "platform/UnixTrayLink.h"
 #include "platform/media/MediaProcessPlayer.h"
 #include "show/ShowPlayer.h"
 #include "suite/channelio/ChannelIOControl.h"
-#include "suite/channelio/serial/SerialOutputs.h"
 #include "suite/seqlib/FileSequenceLibrary.h"
 #include "suite/shellcmd/SpawningShellCommandManager.h"
 #include "support/Error.h"
@@ -167,27 +163,8 @@ int RunPlayer(const PlayerOptions& options) {
   auto shellCommands = std::make_shared<SpawningShellCommandManager>(
       std::make_shared<PosixProcessSpawner>(), timers);
 
-  UdpDatagramNetwork network(loop);
-  TimerfdDeadlineTimer frameTimer(loop);
-  LockFileOutputClaim claim;
-  ChannelIOPorts ports;
-  ports.clock = clock.get();
-  ports.timer = &frameTimer;
-  ports.network = &network;
-  ports.log = &relay;
-  ports.settings = &registry;
-  ports.claim = &claim;
-  // The serial networks (TAV controllers, DMX widgets, X10, Fennick) open
-  // through these; an input a serial controller reports joins the others.
-  PosixSerialPorts serialPorts(loop);
-  ChannelIOControl* controlForInputs = nullptr;
-  SerialOutputs serial({&serialPorts, &timers, clock.get(), &relay},
-                       [&controlForInputs](int32_t network, int32_t unit, int32_t input) {
-                         if (controlForInputs) controlForInputs->InjectInput(network, unit, input);
-                       });
-  ports.serial = &serial;
-  auto control = std::make_shared<ChannelIOControl>(ports);
-  controlForInputs = control.get();
+  LocalChannelIO channelIO(loop, *clock, timers, relay, registry);
+  const std::shared_ptr<ChannelIOControl>& control = channelIO.Control();
 
   // The music and video play in the media process, beside this program (or
   // as $TAV_MEDIA_HELPER says). Without it the shows go on without sound: it

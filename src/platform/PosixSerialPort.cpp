@@ -1,5 +1,6 @@
 #include "platform/PosixSerialPort.h"
 
+#include <poll.h>
 #include <sys/ioctl.h>
 #include <termios.h>
 #include <unistd.h>
@@ -11,6 +12,7 @@
 #include <chrono>
 #include <cstring>
 #include <deque>
+#include <thread>
 #include <vector>
 
 #include "platform/PosixSerialDevice.h"
@@ -55,6 +57,7 @@ struct LinkCore : std::enable_shared_from_this<LinkCore> {
   void Lost(const std::string& reason);
   void Reopen();
   void Report(bool connected, const std::string& reason);
+  void FlushBeforeClose(std::chrono::milliseconds limit);
   void Close();
   int Fd() { return descriptor.native_handle(); }
 
@@ -254,6 +257,47 @@ void LinkCore::Reopen() {
   });
 }
 
+// Hands the device what is still queued, waiting for it at most `limit`, on
+// the calling thread: a network's last frame is usually its lights-off, and
+// the program is about to let go of the port. Breaks are timed by sleeping;
+// they last a fraction of a millisecond.
+void LinkCore::FlushBeforeClose(std::chrono::milliseconds limit) {
+  if (closed || !connected) return;
+  const auto deadline = SteadyClock::now() + limit;
+  breakTimer.cancel();
+  if (inBreak) ::ioctl(Fd(), TIOCCBRK);
+  inBreak = false;
+  while (!queue.empty() && SteadyClock::now() < deadline) {
+    Chunk& chunk = queue.front();
+    if (chunk.breakMicros > 0) {
+      std::this_thread::sleep_until(std::min(lineFreeAt, deadline));
+      ::tcdrain(Fd());
+      ::ioctl(Fd(), TIOCSBRK);
+      std::this_thread::sleep_for(std::chrono::microseconds(chunk.breakMicros));
+      ::ioctl(Fd(), TIOCCBRK);
+      std::this_thread::sleep_for(std::chrono::microseconds(chunk.markMicros));
+      chunk.breakMicros = 0;
+    }
+    const ssize_t n =
+        ::write(Fd(), chunk.bytes.data() + chunk.offset, chunk.bytes.size() - chunk.offset);
+    if (n < 0) {
+      if (errno == EINTR) continue;
+      if (errno != EAGAIN && errno != EWOULDBLOCK) return;
+      auto left =
+          std::chrono::duration_cast<std::chrono::milliseconds>(deadline - SteadyClock::now());
+      pollfd writable{Fd(), POLLOUT, 0};
+      if (left.count() <= 0 || ::poll(&writable, 1, static_cast<int>(left.count())) <= 0) return;
+      continue;
+    }
+    lineFreeAt = std::max(SteadyClock::now(), lineFreeAt) +
+                 std::chrono::microseconds(
+                     SerialLineMicros(static_cast<size_t>(n), settings.baud, settings.stopBits));
+    chunk.offset += static_cast<size_t>(n);
+    queued -= static_cast<size_t>(n);
+    if (chunk.offset == chunk.bytes.size()) queue.pop_front();
+  }
+}
+
 void LinkCore::Close() {
   if (closed) return;
   closed = true;
@@ -268,10 +312,16 @@ void LinkCore::Close() {
 
 namespace {
 
+// How long closing a link may wait for the device to take what is queued.
+constexpr std::chrono::milliseconds kLastWordsLimit{250};
+
 class PosixSerialLink : public SerialLink {
  public:
   explicit PosixSerialLink(std::shared_ptr<LinkCore> core) : m_core(std::move(core)) {}
-  ~PosixSerialLink() override { m_core->Close(); }
+  ~PosixSerialLink() override {
+    m_core->FlushBeforeClose(kLastWordsLimit);
+    m_core->Close();
+  }
 
   bool Write(std::span<const uint8_t> bytes) override { return m_core->Queue(bytes, 0, 0); }
   bool WriteAfterBreak(std::span<const uint8_t> bytes, uint32_t breakMicros,

@@ -9,6 +9,7 @@
 #include <unistd.h>
 
 #include <atomic>
+#include <chrono>
 #include <mutex>
 #include <thread>
 
@@ -35,9 +36,13 @@ class PtyBoards {
       std::vector<uint8_t> buffer(4096);
       while (!m_stop) {
         pollfd p{m_master, POLLIN, 0};
-        if (::poll(&p, 1, 20) <= 0) continue;
+        if (::poll(&p, 1, 20) <= 0) {
+          ++m_idlePolls;
+          continue;
+        }
         ssize_t n = ::read(m_master, buffer.data(), buffer.size());
         if (n <= 0) continue;
+        m_idlePolls = 0;
         std::lock_guard<std::mutex> lock(m_mutex);
         m_chain.Feed(std::span<const uint8_t>(buffer.data(), static_cast<size_t>(n)));
       }
@@ -50,6 +55,13 @@ class PtyBoards {
     ::close(m_slave);
   }
   const std::string& Path() const { return m_path; }
+  // The command may have ended with its last frames still in the terminal's
+  // buffer: waits until the reader has found nothing more for a while.
+  void Drain() {
+    for (int i = 0; i < 200 && m_idlePolls < 3; ++i) {
+      std::this_thread::sleep_for(std::chrono::milliseconds(10));
+    }
+  }
   template <typename Look>
   void With(Look look) {
     std::lock_guard<std::mutex> lock(m_mutex);
@@ -62,6 +74,7 @@ class PtyBoards {
   DimmerChainModel m_chain;
   std::mutex m_mutex;
   std::atomic<bool> m_stop{false};
+  std::atomic<int> m_idlePolls{0};
   std::thread m_reader;
 };
 
@@ -96,6 +109,8 @@ TEST_F(SequencePlaySerial, APlainSequenceReachesTheTAVAndFennickBoards) {
       Run({"sequence", "play", std::string(TAV_SOURCE_DIR) + "/examples/sequences/front-yard.tseq",
            "--seconds", "2"});
   ASSERT_EQ(r.exitCode, 0) << r.err;
+  tav.Drain();
+  fennick.Drain();
   tav.With([&](DimmerChainModel& chain) {
     EXPECT_EQ(chain.Errors(), 0u);
     ASSERT_FALSE(roofLine.empty());

@@ -23,6 +23,16 @@ SerialFrameSender::SerialFrameSender(FrameSenderOptions options, std::unique_ptr
       [this](bool connected, const std::string& reason) { OnConnectionChange(connected, reason); });
 }
 
+SerialFrameSender::~SerialFrameSender() {
+  m_timer.Cancel();
+  if (!m_waiting || !m_link->Connected()) return;
+  if (m_options.breakMicros > 0) {
+    m_link->WriteAfterBreak(m_next, m_options.breakMicros, m_options.markMicros);
+  } else {
+    m_link->Write(m_next);
+  }
+}
+
 void SerialFrameSender::Send(std::span<const uint8_t> frame) {
   if (m_waiting) ++m_counters.framesReplaced;
   m_next.assign(frame.begin(), frame.end());

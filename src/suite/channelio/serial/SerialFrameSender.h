@@ -60,6 +60,9 @@ class SerialFrameSender {
  public:
   SerialFrameSender(FrameSenderOptions options, std::unique_ptr<SerialLink> link,
                     TimerService& timers, const Clock& clock, MessageLog& log);
+  // A frame still waiting for the line goes to the link at once: closing a
+  // network must not lose its last frame (see SerialLink).
+  ~SerialFrameSender();
   SerialFrameSender(const SerialFrameSender&) = delete;
   SerialFrameSender& operator=(const SerialFrameSender&) = delete;
 

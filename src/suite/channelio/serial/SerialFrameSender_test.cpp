@@ -74,6 +74,21 @@ TEST_F(SerialSendersTest, DimmerFramesArePacedToWhatTheSpeedCarries) {
   EXPECT_EQ(chain.AllChannels(), std::vector<uint8_t>(574, 79));
 }
 
+TEST_F(SerialSendersTest, AFrameWaitingForTheLineIsNotLostWhenTheNetworkCloses) {
+  auto dimmer = Dimmer(574, 115200);
+  std::vector<uint8_t> lastWritten;
+  fake->SetOnWrite(
+      [&](std::span<const uint8_t> bytes) { lastWritten.assign(bytes.begin(), bytes.end()); });
+  dimmer->SendLevels(std::vector<uint8_t>(574, 200));
+  timers.Advance(10);                                // the line is still busy with the first frame
+  dimmer->SendLevels(std::vector<uint8_t>(574, 0));  // lights off, then close
+  EXPECT_TRUE(dimmer->Sender().FrameWaiting());
+  dimmer.reset();
+  DimmerChainModel chain(1, 574);
+  chain.Feed(lastWritten);
+  EXPECT_EQ(chain.AllChannels(), std::vector<uint8_t>(574, 0));
+}
+
 TEST_F(SerialSendersTest, TooManyChannelsForTheSpeedIsOneWarning) {
   auto dimmer = Dimmer(600, 115200);
   ASSERT_EQ(log.lines.size(), 1u);

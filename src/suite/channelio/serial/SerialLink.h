@@ -9,6 +9,10 @@
 // caller never sends half a frame. Received bytes and connection changes
 // arrive on the loop, never from inside a call to the link.
 //
+// Destroying a link first hands the device what is still queued, waiting a
+// moment at most, so that a network's last frame (its lights-off) is not
+// lost because the line was busy when the network closed.
+//
 // A link outlives the device behind it: when a USB adapter is unplugged the
 // link reports the loss once, keeps trying to reopen the same path with a
 // growing pause, and reports once more when the device is back. Writes while
