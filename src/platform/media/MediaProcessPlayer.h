@@ -45,7 +45,6 @@
 
 #include "platform/EventLoop.h"
 #include "platform/media/MediaClock.h"
-#include "platform/media/MediaPlayState.h"
 #include "platform/media/MpvOutputs.h"
 #include "ports/MessageLog.h"
 #include "show/MediaPlayer.h"
