@@ -32,10 +32,18 @@ endif()
 
 # tav_subsystem(NAME DEPS ...): builds every non-test .cpp of the calling
 # folder into the static library NAME and every *_test.cpp into NAME_tests,
-# registered with ctest.
+# registered with ctest. MATCHING or EXCLUDING (a regular expression on the
+# file name) splits a folder into two libraries, as when only some of its
+# files may pull in a heavy dependency.
 function(tav_subsystem name)
-  cmake_parse_arguments(ARG "" "" "DEPS;TEST_DEPS" ${ARGN})
+  cmake_parse_arguments(ARG "" "MATCHING;EXCLUDING" "DEPS;TEST_DEPS" ${ARGN})
   file(GLOB all_sources CONFIGURE_DEPENDS ${CMAKE_CURRENT_SOURCE_DIR}/*.cpp)
+  if(ARG_MATCHING)
+    list(FILTER all_sources INCLUDE REGEX "/${ARG_MATCHING}[^/]*$")
+  endif()
+  if(ARG_EXCLUDING)
+    list(FILTER all_sources EXCLUDE REGEX "/${ARG_EXCLUDING}[^/]*$")
+  endif()
   set(lib_sources ${all_sources})
   list(FILTER lib_sources EXCLUDE REGEX "_test\\.cpp$")
   set(test_sources ${all_sources})

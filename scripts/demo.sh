@@ -16,7 +16,7 @@ repo=$(pwd)
 
 bash scripts/install-deps.sh
 cmake --preset release >/dev/null
-cmake --build build/release --target showplayer showctl
+cmake --build build/release --target showplayer showplayer-media showctl
 
 demo="$repo/build/demo"
 python3 examples/demo/make_demo.py "$demo/data"

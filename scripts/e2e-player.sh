@@ -4,7 +4,9 @@
 # capturing the E1.31 it sends. Checks, in this order:
 #   1. a second showplayer on the same socket ends at once (status 3);
 #   2. the demo show starts; `showctl trigger 1 1 1` fires the doorbell group
-#      and its sequence starts (seen by `showctl monitor`);
+#      and its sequence starts (seen by `showctl monitor`); the music plays
+#      in a media process of its own, the only one with libmpv, and killing
+#      it is logged while the show plays on;
 #   3. `showctl ondemand quiet.show` switches the show;
 #   4. `showctl shutdown` winds it down and the player exits 0;
 #   5. the captured E1.31 holds all 16 universes, the FSEQ chase's comet
@@ -35,10 +37,11 @@ fi
 "${netns[@]}" true 2>/dev/null || skip "cannot make a private network namespace here (${netns[*]} failed)"
 
 if [ -z "${TAV_E2E_INSIDE:-}" ]; then
-  if [ ! -x "$build/apps/showplayer/showplayer" ] || [ ! -x "$build/apps/showctl/showctl" ]; then
+  if [ ! -x "$build/apps/showplayer/showplayer" ] || [ ! -x "$build/apps/showplayer/showplayer-media" ] ||
+    [ ! -x "$build/apps/showctl/showctl" ]; then
     preset=$(basename "$build")
     cmake --preset "$preset" >/dev/null
-    cmake --build "$build" --target showplayer showctl
+    cmake --build "$build" --target showplayer showplayer-media showctl
   fi
   exec timeout --kill-after=10 200 "${netns[@]}" env TAV_E2E_INSIDE=1 bash "$0" "$build"
 fi
@@ -117,6 +120,19 @@ wait_for "Registering interactive triggers" 20 "$work/monitor.log"
 WAIT_RE=1 wait_for "Starting Interactive: (.*/)?doorbell.tseq" 5 "$work/monitor.log"
 grep -qE "^start +(.*/)?doorbell.tseq" "$work/monitor.log" || fail "no sequence-start notice for doorbell.tseq"
 echo "e2e-player: the demo show plays and showctl trigger rang the doorbell"
+
+# The music plays in the media process, the one that maps libmpv; when it
+# dies the player says so and the show plays on.
+media=""
+for child in $(cat /proc/"$player_pid"/task/*/children 2>/dev/null); do
+  [ "$(cat "/proc/$child/comm" 2>/dev/null)" != showplayer-medi ] || media=$child  # comm: 15 bytes
+done
+[ -n "$media" ] || fail "no media process (showplayer-media) beside the player"
+grep -q libmpv "/proc/$media/maps" || fail "the media process has no libmpv loaded"
+! grep -q libmpv "/proc/$player_pid/maps" || fail "the player itself has libmpv loaded"
+kill -KILL "$media"
+wait_for "Media: the media process ended unexpectedly (killed by signal 9" 5 "$work/monitor.log"
+echo "e2e-player: the media process (pid $media) was killed; the player said so and plays on"
 
 # 3. A show on demand replaces it (the musical piece may finish first).
 "$showctl" ondemand quiet.show

@@ -15,10 +15,12 @@
 # the player is not counted; otherwise they go to 127.0.0.1.
 # For each: CPU (% of one core, from /proc/PID/stat), resident memory
 # (VmRSS and its peak VmHWM), threads, and context switches per second (how
-# often the process wakes up). With tshark it also counts the E1.31 packets
-# per universe, so the frame rate that reached the wire is printed beside.
-# The music plays to mpv's null output (a sound card would not change the
-# process's own work; a sound server would add its own).
+# often the process wakes up), for the player and, on a line of its own, for
+# its media process (showplayer-media, which plays the music), with the two
+# together. With tshark it also counts the E1.31 packets per universe, so the
+# frame rate that reached the wire is printed beside. The music plays to
+# mpv's null output (a sound card would not change the process's own work; a
+# sound server would add its own).
 #
 # Usage: scripts/measure-player.sh [SECONDS]      (default 60; BUILD_DIR=build/release)
 set -euo pipefail
@@ -28,9 +30,10 @@ seconds=${1:-60}
 build=${BUILD_DIR:-build/release}
 
 if [ -z "${TAV_MEASURE_INSIDE:-}" ]; then
-  if [ ! -x "$build/apps/showplayer/showplayer" ] || [ ! -x "$build/apps/showctl/showctl" ]; then
+  if [ ! -x "$build/apps/showplayer/showplayer" ] || [ ! -x "$build/apps/showplayer/showplayer-media" ] ||
+    [ ! -x "$build/apps/showctl/showctl" ]; then
     cmake --preset "$(basename "$build")" >/dev/null
-    cmake --build "$build" --target showplayer showctl
+    cmake --build "$build" --target showplayer showplayer-media showctl
   fi
   if [ "$(id -u)" -eq 0 ]; then netns=(unshare --net); else netns=(unshare --net --map-root-user); fi
   if command -v ip >/dev/null 2>&1 &&
@@ -84,36 +87,67 @@ mv "$work/data/weeksched.tmp" "$work/data/weeksched.tsc"
 
 cpu_ticks() { awk '{print $14 + $15}' "/proc/$1/stat"; }
 # The loop's own thread (the engine, the control, the host), apart from
-# the media player's threads.
+# any other thread.
 loop_ticks() { awk '{print $14 + $15}' "/proc/$1/task/$1/stat"; }
 switches() {
   awk '/^voluntary_ctxt_switches|^nonvoluntary_ctxt_switches/ {s += $2} END {print s}' "/proc/$1/status"
 }
 status_kb() { awk -v key="$2:" '$1 == key {print $2}' "/proc/$1/status"; }
+# The player's media process, if one runs.
+media_pid() {
+  local child
+  for child in $(cat /proc/"$1"/task/*/children 2>/dev/null); do
+    if [ "$(cat "/proc/$child/comm" 2>/dev/null)" = showplayer-medi ]; then  # comm: 15 bytes
+      echo "$child"
+      return
+    fi
+  done
+}
 
-# Samples the process over $seconds and prints one line of figures.
+# Samples the player and its media process over $seconds and prints one
+# line of figures for each, and their memory together.
 measure() {
   local pid=$1 label=$2
-  local c0 s0 l0 c1 s1 l1
+  local media c0 s0 l0 c1 s1 l1 mc0="" ms0="" mfig=()
+  media=$(media_pid "$pid")
   c0=$(cpu_ticks "$pid")
   l0=$(loop_ticks "$pid")
   s0=$(switches "$pid")
+  if [ -n "$media" ]; then
+    mc0=$(cpu_ticks "$media")
+    ms0=$(switches "$media")
+  fi
   sleep "$seconds"
   c1=$(cpu_ticks "$pid")
   l1=$(loop_ticks "$pid")
   s1=$(switches "$pid")
+  if [ -n "$media" ] && [ -e "/proc/$media/stat" ]; then
+    mfig=("$mc0" "$(cpu_ticks "$media")" "$ms0" "$(switches "$media")"
+      "$(status_kb "$media" VmRSS)" "$(status_kb "$media" VmHWM)"
+      "$(status_kb "$media" RssAnon)" "$(status_kb "$media" Threads)")
+  fi
   python3 - "$label" "$c0" "$c1" "$s0" "$s1" "$ticks" "$seconds" "$l0" "$l1" \
     "$(status_kb "$pid" VmRSS)" "$(status_kb "$pid" VmHWM)" "$(status_kb "$pid" RssAnon)" \
-    "$(status_kb "$pid" Threads)" <<'EOF'
+    "$(status_kb "$pid" Threads)" "${mfig[@]}" <<'EOF'
 import sys
-label, c0, c1, s0, s1, tck, secs, l0, l1, rss, hwm, anon, threads = sys.argv[1:]
-cpu = (int(c1) - int(c0)) / int(tck) / float(secs) * 100
-loop = (int(l1) - int(l0)) / int(tck) / float(secs) * 100
-wakes = (int(s1) - int(s0)) / float(secs)
-print(f"{label}: CPU {cpu:.2f}% of one core over {secs} s (the loop's thread {loop:.2f}%); "
+label, c0, c1, s0, s1, tck, secs, l0, l1, rss, hwm, anon, threads = sys.argv[1:14]
+tck, secs = int(tck), float(secs)
+def rate(a, b, per=1.0):
+    return (int(b) - int(a)) / per / secs
+print(f"{label}: CPU {rate(c0, c1, tck) * 100:.2f}% of one core over {secs:g} s "
+      f"(the loop's thread {rate(l0, l1, tck) * 100:.2f}%); "
       f"RSS {int(rss)/1024:.1f} MiB (peak {int(hwm)/1024:.1f} MiB, of it private "
       f"{int(anon)/1024:.1f} MiB, the rest shared libraries); {threads} threads; "
-      f"{wakes:.0f} context switches/s")
+      f"{rate(s0, s1):.0f} context switches/s")
+if len(sys.argv) > 14:
+    mc0, mc1, ms0, ms1, mrss, mhwm, manon, mthreads = sys.argv[14:22]
+    print(f"{label}, media process: CPU {rate(mc0, mc1, tck) * 100:.2f}% of one core; "
+          f"RSS {int(mrss)/1024:.1f} MiB (peak {int(mhwm)/1024:.1f} MiB, private "
+          f"{int(manon)/1024:.1f} MiB); {mthreads} threads; {rate(ms0, ms1):.0f} context switches/s")
+    print(f"{label}, together: RSS {(int(rss) + int(mrss))/1024:.1f} MiB, private "
+          f"{(int(anon) + int(manon))/1024:.1f} MiB")
+else:
+    print(f"{label}: no media process ran through the measurement")
 EOF
 }
 

@@ -6,9 +6,9 @@
 #
 #   bash scripts/soak.sh [MINUTES]      (default 30 after the warm-up; BUILD_DIR=build/release)
 #
-# Reports resident memory and open file descriptors after three minutes of
-# warm-up (the first music has then played: the media player's buffers are
-# made on first use) and at the end, the number of shows started, and every
+# Reports the player's resident memory and open file descriptors (and its
+# media process's resident memory) after three minutes of warm-up (the first
+# music has then played: buffers are made on first use) and at the end, the number of shows started, and every
 # error line of the log. Fails when memory grew by more than 2 MiB, when the
 # most descriptors open at once in the last five samples exceed those of the
 # first five (files are open only while a sequence or a song loads, so one
@@ -19,9 +19,10 @@ repo=$(pwd)
 minutes=${1:-30}
 build=${BUILD_DIR:-build/release}
 
-if [ ! -x "$build/apps/showplayer/showplayer" ] || [ ! -x "$build/apps/showctl/showctl" ]; then
+if [ ! -x "$build/apps/showplayer/showplayer" ] || [ ! -x "$build/apps/showplayer/showplayer-media" ] ||
+    [ ! -x "$build/apps/showctl/showctl" ]; then
   cmake --preset "$(basename "$build")" >/dev/null
-  cmake --build "$build" --target showplayer showctl
+  cmake --build "$build" --target showplayer showplayer-media showctl
 fi
 showplayer="$repo/$build/apps/showplayer/showplayer"
 showctl="$repo/$build/apps/showctl/showctl"
@@ -65,30 +66,39 @@ EOF
 "$showplayer" >"$work/player.log" 2>&1 &
 player_pid=$!
 
+# The player's resident memory and descriptors, and its media process's
+# resident memory (reported, not judged: it swings by some 30 MB with
+# whether music plays at the moment of the sample).
 sample() {
-  local rss fds
+  local rss fds child media=-
   rss=$(awk '/^VmRSS:/ {print $2}' "/proc/$player_pid/status")
   fds=$(ls "/proc/$player_pid/fd" | wc -l)
-  echo "$rss $fds"
+  for child in $(cat /proc/"$player_pid"/task/*/children 2>/dev/null); do
+    if [ "$(cat "/proc/$child/comm" 2>/dev/null)" = showplayer-medi ]; then  # comm: 15 bytes
+      media=$(awk '/^VmRSS:/ {print $2}' "/proc/$child/status" 2>/dev/null || echo -)
+    fi
+  done
+  echo "$rss $fds $media"
 }
 
 sleep 180
-read -r rss0 fds0 < <(sample)
-echo "soak: after 3 min warm-up: RSS ${rss0} KiB, ${fds0} open descriptors"
+read -r rss0 fds0 media0 < <(sample)
+echo "soak: after 3 min warm-up: RSS ${rss0} KiB, ${fds0} open descriptors; media process RSS ${media0} KiB"
 fd_samples=("$fds0")
 end=$((SECONDS + minutes * 60))
 while [ $SECONDS -lt $end ]; do
   kill -0 "$player_pid" 2>/dev/null || { echo "soak: FAILED: the player ended early"; tail -n 20 "$work/player.log"; exit 1; }
   sleep 30
-  read -r rss fds < <(sample)
+  read -r rss fds media < <(sample)
   fd_samples+=("$fds")
-  echo "soak: $(date +%T) RSS ${rss} KiB, ${fds} descriptors, shows started: $(grep -c 'Starting show: ' "$work/player.log" || true)"
+  echo "soak: $(date +%T) RSS ${rss} KiB, ${fds} descriptors, media process RSS ${media} KiB, shows started: $(grep -c 'Starting show: ' "$work/player.log" || true)"
 done
-read -r rss1 fds1 < <(sample)
+read -r rss1 fds1 media1 < <(sample)
 fd_samples+=("$fds1")
-most() { printf '%s\n' "$@" | sort -n | tail -n 1; }
-fds_first=$(most "${fd_samples[@]:0:5}")
-fds_last=$(most "${fd_samples[@]: -5}")
+# The most descriptors open in the first and in the last five samples (a
+# short soak has fewer: then both look at all of them).
+fds_first=$(printf '%s\n' "${fd_samples[@]}" | head -n 5 | sort -n | tail -n 1)
+fds_last=$(printf '%s\n' "${fd_samples[@]}" | tail -n 5 | sort -n | tail -n 1)
 kill -TERM "$player_pid"
 set +e
 wait "$player_pid"
@@ -99,7 +109,7 @@ player_pid=""
 errors=$(grep -E '^[0-9-]+ [0-9:]+ error ' "$work/player.log" || true)
 shows=$(grep -c 'Starting show: ' "$work/player.log" || true)
 echo "soak: ${minutes} min, ${shows} shows started"
-echo "soak: RSS ${rss0} KiB -> ${rss1} KiB; descriptors at most ${fds_first} in the first samples, ${fds_last} in the last; exit status ${status}"
+echo "soak: RSS ${rss0} KiB -> ${rss1} KiB (media process ${media0} -> ${media1} KiB); descriptors at most ${fds_first} in the first samples, ${fds_last} in the last; exit status ${status}"
 ok=1
 if [ -n "$errors" ]; then echo "soak: error lines:"; echo "$errors"; ok=0; fi
 if [ $((rss1 - rss0)) -gt 2048 ]; then echo "soak: resident memory grew by $((rss1 - rss0)) KiB"; ok=0; fi

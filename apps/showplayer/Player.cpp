@@ -25,7 +25,7 @@
 #include "platform/Realtime.h"
 #include "platform/SystemClock.h"
 #include "platform/UnixTrayLink.h"
-#include "platform/media/MpvMediaPlayer.h"
+#include "platform/media/MediaProcessPlayer.h"
 #include "show/ShowPlayer.h"
 #include "suite/channelio/ChannelIOControl.h"
 #include "suite/seqlib/FileSequenceLibrary.h"
@@ -155,16 +155,14 @@ int RunPlayer(const PlayerOptions& options) {
   LocalChannelIO channelIO(loop, *clock, timers, relay, registry);
   const std::shared_ptr<ChannelIOControl>& control = channelIO.Control();
 
-  std::unique_ptr<MpvMediaPlayer> media;
-  try {
-    media = std::make_unique<MpvMediaPlayer>(loop, relay, MpvOutputs::FromSettings(settings));
-  } catch (const Error& e) {
-    Say("the media player cannot start: " + e.Description());
-    return kExitShowsNotEnabled;
-  }
+  // The music and video play in the media process, beside this program (or
+  // as $TAV_MEDIA_HELPER says). Without it the shows go on without sound: it
+  // logs why, and each media file tries to start it again.
+  MediaProcessPlayer media(loop, relay, MpvOutputs::FromSettings(settings),
+                           MediaProcessPlayer::DefaultProgramPath());
 
-  // After the media player has started its threads, so that only the loop
-  // (timers, frames, the engine) runs at real-time priority.
+  // Only the loop (timers, frames, the engine) runs at real-time priority;
+  // media processes, started before or after, run at normal priority.
   if (options.realtimePriority > 0) {
     std::string refused = RequestRealtimePriority(options.realtimePriority);
     if (refused.empty()) {
@@ -184,7 +182,7 @@ int RunPlayer(const PlayerOptions& options) {
       .trayLink = *link,
       .files = files,
       .cio = control,
-      .media = *media,
+      .media = media,
       .memory = memory,
       .library = library,
       .fileSystem = fileSystem,
@@ -238,7 +236,7 @@ int RunPlayer(const PlayerOptions& options) {
   std::unique_ptr<SyncProbe> probe;
   if (const char* where = std::getenv("TAV_SYNC_PROBE")) {
     if (auto parsed = SyncProbe::Parse(where)) {
-      probe = std::make_unique<SyncProbe>(control->Levels(), *media, *parsed);
+      probe = std::make_unique<SyncProbe>(control->Levels(), media, *parsed);
     } else {
       Say(std::string("TAV_SYNC_PROBE=") + where + " is not UNIVERSE:SLOT:PERIOD_MS; no probe");
     }

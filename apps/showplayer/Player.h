@@ -2,9 +2,9 @@
 // The composition root of the show player: builds every real adapter (the
 // event loop, timers on it, the system clock, the settings file, the tray
 // socket, local files, the sequence library, shell commands, the process
-// memory probe, the hardware-I/O control with its UDP outputs, and the media
-// player on libmpv), hands them to the host form, loads it and runs the loop
-// until the form has unloaded.
+// memory probe, the hardware-I/O control with its UDP and serial outputs, and
+// the media player served by the media process), hands them to the host
+// form, loads it and runs the loop until the form has unloaded.
 //
 // Before anything is built it takes the instance lock beside the tray
 // socket; without it the player ends at once. Signals: the first SIGTERM or

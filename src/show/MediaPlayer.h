@@ -19,6 +19,8 @@ namespace tav {
 inline constexpr int32_t kMediaStopped = 1;
 inline constexpr int32_t kMediaPaused = 2;
 inline constexpr int32_t kMediaPlaying = 3;
+// Between opening a file and the start of its playback.
+inline constexpr int32_t kMediaTransitioning = 9;
 
 class MediaPlayer {
  public:

@@ -22,6 +22,13 @@ void MediaClock::SetEnd(double seconds) {
   m_end = seconds;
 }
 
+void MediaClock::Follow(const Snapshot& other) {
+  m_base = other.position;
+  m_baseTime = other.at;
+  m_end = other.end;
+  m_running = other.running;
+}
+
 double MediaClock::Position(TimePoint now) const {
   if (!m_running) return m_base;
   auto runOn = std::clamp(now - m_baseTime, TimePoint::duration::zero(),

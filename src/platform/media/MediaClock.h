@@ -9,6 +9,10 @@
 // never more than kMaxRunOn beyond the latest report, so a player that stalls
 // does not run away.
 //
+// The media process hands its clock to the player (Snapshot, Follow): both
+// processes read the same steady clock (CLOCK_MONOTONIC), so the player's
+// copy runs exactly as the original does.
+//
 // Pure: the caller passes the times. Owned by the media player adapter.
 
 #include <chrono>
@@ -29,6 +33,18 @@ class MediaClock {
   void Run(TimePoint at);
   // The media's length in seconds; 0 or less: unknown.
   void SetEnd(double seconds);
+
+  // What the clock knows, to be taken over by a clock in another process.
+  struct Snapshot {
+    double position = 0;  // reported at `at`
+    TimePoint at{};
+    double end = 0;  // 0 or less: unknown
+    bool running = false;
+  };
+  Snapshot Take() const { return {m_base, m_baseTime, m_end, m_running}; }
+  // Takes over what another clock knows. The position this clock has given
+  // is still never taken back while it runs.
+  void Follow(const Snapshot& other);
 
   bool Running() const { return m_running; }
   double Position(TimePoint now) const;

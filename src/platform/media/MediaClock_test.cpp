@@ -67,5 +67,23 @@ TEST_F(MediaClockTest, ResetForgetsEverything) {
   EXPECT_NEAR(PositionAt(30ms), 0.010, 1e-9);  // nothing held over from before
 }
 
+TEST_F(MediaClockTest, AFollowerRunsAsTheClockItFollowsAndNeverGoesBack) {
+  clock.SetEnd(10.0);
+  clock.Report(2.0, At(100ms));
+  clock.Run(At(100ms));
+  MediaClock follower;
+  follower.Follow(clock.Take());
+  for (auto ms : {100ms, 350ms, 900ms}) EXPECT_DOUBLE_EQ(follower.Position(At(ms)), PositionAt(ms));
+
+  clock.Report(2.7, At(1000ms));  // the original fell back by 0.1 s
+  follower.Follow(clock.Take());
+  EXPECT_NEAR(follower.Position(At(1000ms)), 2.8, 1e-9);
+  EXPECT_NEAR(follower.Position(At(1200ms)), 2.9, 1e-9);
+
+  clock.Report(9.9, At(2000ms));
+  follower.Follow(clock.Take());
+  EXPECT_DOUBLE_EQ(follower.Position(At(2500ms)), 10.0) << "beyond the end";
+}
+
 }  // namespace
 }  // namespace tav

@@ -5,16 +5,14 @@
 #include <asio.hpp>
 #include <chrono>
 #include <cstdlib>
-#include <deque>
-#include <exception>
 #include <filesystem>
 #include <initializer_list>
 #include <optional>
 #include <string_view>
 #include <vector>
 
-#include "config/Settings.h"
 #include "platform/media/MediaClock.h"
+#include "platform/media/MediaPlayState.h"
 #include "support/Error.h"
 
 // Playlist entry ids in the loadfile reply and the start/end events.
@@ -83,12 +81,9 @@ std::string DescribeAudioOutput(const MpvOutputs& outputs) {
 
 }  // namespace
 
-MpvOutputs MpvOutputs::FromSettings(const Settings& settings) {
-  return {settings.AudioOutput(), settings.AudioDevice(), settings.VideoOutput()};
-}
-
 struct MpvMediaPlayer::Impl : std::enable_shared_from_this<Impl> {
-  Impl(EventLoop& loop, MessageLog& log) : loop(loop), log(log), tailTimer(loop.Context()) {}
+  Impl(EventLoop& loop, MessageLog& log)
+      : loop(loop), log(log), plays(loop, log, kSource), tailTimer(loop.Context()) {}
 
   // What mpv's threads see of us: the wakeup callback posts a drain to the
   // loop, with a weak reference so that a drain arriving after we are gone
@@ -115,11 +110,7 @@ struct MpvMediaPlayer::Impl : std::enable_shared_from_this<Impl> {
   void Fail(const std::string& reason);
   void BeginNewPlay();
 
-  void SetState(int32_t newState);
-  void NotifyState(int32_t newState);
-  void NotifyError();
-  template <typename Call>
-  void PostToHandler(Call call);
+  void NotifyClock();
 
   void SetPropertyAsync(const char* name, const std::string& value);
   int CommandAsync(std::initializer_list<const char*> words, uint64_t tag = 0);
@@ -131,11 +122,11 @@ struct MpvMediaPlayer::Impl : std::enable_shared_from_this<Impl> {
   std::unique_ptr<Wakeup> wakeup;
   MpvOutputs outputs;
 
-  // The play the engine asked for last: its generation (bumped by every
-  // OpenMedia and Stop; the loadfile command carries it, so that the answer
-  // to a superseded load is known), mpv's playlist entry for it (-1 until
-  // mpv answers), and whether that entry is being played.
-  uint64_t generation = 0;
+  // The play the engine asked for last: its state, its generation (bumped
+  // by every OpenMedia and Stop; the loadfile command carries it, so that the
+  // answer to a superseded load is known), mpv's playlist entry for it (-1
+  // until mpv answers), and whether that entry is being played.
+  MediaPlayState plays;
   int64_t entryId = -1;
   bool entryLive = false;
   int64_t startedId = -1;  // the entry of mpv's latest start-file
@@ -143,10 +134,8 @@ struct MpvMediaPlayer::Impl : std::enable_shared_from_this<Impl> {
 
   std::string path;
   std::string mediaType;
-  int32_t state = kMediaStopped;
   MediaClock clock;
   asio::steady_timer tailTimer;
-  std::deque<std::string> errors;
 
   std::string shownVideoOutput;  // mpv's "vo" while the form is shown
   bool hasVideoOutput = true;
@@ -155,8 +144,7 @@ struct MpvMediaPlayer::Impl : std::enable_shared_from_this<Impl> {
   bool fellBackToNull = false;
   bool switchedToNull = false;
 
-  std::function<void(int32_t)> onPlayStateChange;
-  std::function<void()> onMediaError;
+  std::function<void(const MediaClock&)> onClockChange;
 };
 
 void MpvMediaPlayer::Impl::OnWakeup(void* data) noexcept {
@@ -244,8 +232,8 @@ void MpvMediaPlayer::Impl::Start(const MpvOutputs& wanted) {
 
 void MpvMediaPlayer::Impl::Close() {
   tailTimer.cancel();
-  onPlayStateChange = nullptr;
-  onMediaError = nullptr;
+  plays.Silence();
+  onClockChange = nullptr;
   if (!handle) return;
   // Returns only when no callback runs any more, so mpv never sees the
   // wakeup target after this.
@@ -276,7 +264,7 @@ void MpvMediaPlayer::Impl::Drain() {
 void MpvMediaPlayer::Impl::Handle(const mpv_event& event) {
   switch (event.event_id) {
     case MPV_EVENT_COMMAND_REPLY:
-      if (event.reply_userdata == generation) OnLoadReply(event);
+      if (event.reply_userdata == plays.Generation()) OnLoadReply(event);
       break;
     case MPV_EVENT_START_FILE:
       OnStartFile(static_cast<const mpv_event_start_file*>(event.data)->playlist_entry_id);
@@ -285,10 +273,11 @@ void MpvMediaPlayer::Impl::Handle(const mpv_event& event) {
       OnFileOpened(static_cast<const mpv_event_hook*>(event.data)->id);
       break;
     case MPV_EVENT_PLAYBACK_RESTART:
-      if (entryLive && state == kTransitioning) {
+      if (entryLive && plays.State() == kTransitioning) {
         if (mediaType.empty()) mediaType = "audio";  // the hook was missed: mpv too old?
         clock.Run(SteadyClock::now());
-        SetState(kMediaPlaying);
+        NotifyClock();
+        plays.SetState(kMediaPlaying);
       }
       break;
     case MPV_EVENT_END_FILE:
@@ -303,7 +292,7 @@ void MpvMediaPlayer::Impl::Handle(const mpv_event& event) {
       // every file fails with mpv's reason.
       coreGone = true;
       log.LogMessage(3, "Media: mpv has shut down; media cannot be played until restart");
-      if (state != kMediaStopped) Fail("mpv has shut down");
+      if (plays.State() != kMediaStopped) Fail("mpv has shut down");
       break;
     default:
       break;
@@ -343,6 +332,7 @@ void MpvMediaPlayer::Impl::OnFileOpened(uint64_t hookId) {
     double duration = 0;
     if (mpv_get_property(handle, "duration", MPV_FORMAT_DOUBLE, &duration) >= 0) {
       clock.SetEnd(duration);
+      NotifyClock();
     }
   }
   mpv_hook_continue(handle, hookId);
@@ -381,7 +371,7 @@ void MpvMediaPlayer::Impl::OnEndFile(const mpv_event_end_file& end) {
 // heard, so the play state turns to stopped when the position reaches the
 // end.
 void MpvMediaPlayer::Impl::FinishWhenSilent() {
-  double remaining = state == kMediaPlaying ? clock.Remaining(SteadyClock::now()) : 0;
+  double remaining = plays.State() == kMediaPlaying ? clock.Remaining(SteadyClock::now()) : 0;
   if (remaining <= 0) {
     Finish();
     return;
@@ -389,35 +379,31 @@ void MpvMediaPlayer::Impl::FinishWhenSilent() {
   tailTimer.expires_after(
       std::chrono::duration_cast<SteadyClock::duration>(std::chrono::duration<double>(remaining)));
   tailTimer.async_wait(
-      [weak = weak_from_this(), forGeneration = generation](const asio::error_code& error) {
+      [weak = weak_from_this(), forGeneration = plays.Generation()](const asio::error_code& error) {
         auto self = weak.lock();
-        if (error || !self || self->generation != forGeneration) return;
+        if (error || !self || self->plays.Generation() != forGeneration) return;
         self->Finish();
       });
 }
 
 void MpvMediaPlayer::Impl::Finish() {
   clock.Reset();
-  SetState(kMediaStopped);
+  plays.SetState(kMediaStopped);
 }
 
 void MpvMediaPlayer::Impl::Fail(const std::string& reason) {
-  errors.push_back("Cannot play \"" + path + "\": " + reason);
-  while (errors.size() > kMaxQueuedErrors) errors.pop_front();
   entryLive = false;
   entryId = -1;
   tailTimer.cancel();
   clock.Reset();
-  int32_t before = state;
-  state = kMediaStopped;
-  NotifyError();
-  if (before != kMediaStopped) NotifyState(kMediaStopped);
+  plays.Fail("Cannot play \"" + path + "\": " + reason);
 }
 
 void MpvMediaPlayer::Impl::OnProperty(uint64_t id, const mpv_event_property& property) {
   auto now = SteadyClock::now();
   if (id == kTimePos && entryLive && property.format == MPV_FORMAT_DOUBLE) {
     clock.Report(*static_cast<const double*>(property.data), now);
+    NotifyClock();
   } else if (id == kCurrentAudioOutput && property.format == MPV_FORMAT_STRING) {
     std::string_view current = *static_cast<const char* const*>(property.data);
     if (current == "null" && outputs.audioOutput != "null" && !fellBackToNull) {
@@ -429,43 +415,15 @@ void MpvMediaPlayer::Impl::OnProperty(uint64_t id, const mpv_event_property& pro
 }
 
 void MpvMediaPlayer::Impl::BeginNewPlay() {
-  ++generation;
+  plays.BeginPlay();
   entryId = -1;
   entryLive = false;
   tailTimer.cancel();
   clock.Reset();
 }
 
-void MpvMediaPlayer::Impl::SetState(int32_t newState) {
-  if (newState == state) return;
-  state = newState;
-  NotifyState(newState);
-}
-
-template <typename Call>
-void MpvMediaPlayer::Impl::PostToHandler(Call call) {
-  loop.Post([weak = weak_from_this(), call = std::move(call)] {
-    auto self = weak.lock();
-    if (!self) return;
-    try {
-      call(*self);
-    } catch (const std::exception& e) {
-      self->log.LogMessage(3, std::string("MpvMediaPlayer event handler Error: ") + e.what());
-    }
-  });
-}
-
-void MpvMediaPlayer::Impl::NotifyState(int32_t newState) {
-  PostToHandler([newState](Impl& self) {
-    // A copy: the handler may replace itself.
-    if (auto handler = self.onPlayStateChange) handler(newState);
-  });
-}
-
-void MpvMediaPlayer::Impl::NotifyError() {
-  PostToHandler([](Impl& self) {
-    if (auto handler = self.onMediaError) handler();
-  });
+void MpvMediaPlayer::Impl::NotifyClock() {
+  if (onClockChange) onClockChange(clock);
 }
 
 MpvMediaPlayer::MpvMediaPlayer(EventLoop& loop, MessageLog& log, const MpvOutputs& outputs)
@@ -489,8 +447,8 @@ void MpvMediaPlayer::OpenMedia(const std::string& path) {
     p.SetPropertyAsync("ao", "null");
     p.switchedToNull = true;
   }
-  p.SetState(kTransitioning);
-  int result = p.CommandAsync({"loadfile", path.c_str(), "replace"}, p.generation);
+  p.plays.SetState(kTransitioning);
+  int result = p.CommandAsync({"loadfile", path.c_str(), "replace"}, p.plays.Generation());
   if (result < 0) p.Fail(mpv_error_string(result));
 }
 
@@ -498,7 +456,7 @@ void MpvMediaPlayer::Stop() {
   Impl& p = *m_impl;
   p.BeginNewPlay();
   p.CommandAsync({"stop"});
-  p.SetState(kMediaStopped);
+  p.plays.SetState(kMediaStopped);
 }
 
 std::string MpvMediaPlayer::CurrentMediaItemInfo(const std::string& attribute) const {
@@ -512,7 +470,7 @@ double MpvMediaPlayer::CurrentPosition() const {
 }
 
 int32_t MpvMediaPlayer::PlayState() const {
-  return m_impl->state;
+  return m_impl->plays.State();
 }
 
 void MpvMediaPlayer::SetFullScreen(bool value) {
@@ -520,18 +478,15 @@ void MpvMediaPlayer::SetFullScreen(bool value) {
 }
 
 int32_t MpvMediaPlayer::ErrorCount() const {
-  return static_cast<int32_t>(m_impl->errors.size());
+  return m_impl->plays.ErrorCount();
 }
 
 std::string MpvMediaPlayer::ErrorDescription(int32_t index) const {
-  if (index < 0 || index >= ErrorCount()) {
-    throw errors::SubscriptOutOfRange(std::string(kSource) + ".ErrorDescription");
-  }
-  return m_impl->errors[static_cast<size_t>(index)];
+  return m_impl->plays.ErrorDescription(index);
 }
 
 void MpvMediaPlayer::ClearErrorQueue() {
-  m_impl->errors.clear();
+  m_impl->plays.ClearErrorQueue();
 }
 
 void MpvMediaPlayer::ShowVideoForm(int32_t x, int32_t y) {
@@ -557,11 +512,15 @@ void MpvMediaPlayer::HideVideoForm() {
 }
 
 void MpvMediaPlayer::SetOnPlayStateChange(std::function<void(int32_t)> handler) {
-  m_impl->onPlayStateChange = std::move(handler);
+  m_impl->plays.SetOnPlayStateChange(std::move(handler));
 }
 
 void MpvMediaPlayer::SetOnMediaError(std::function<void()> handler) {
-  m_impl->onMediaError = std::move(handler);
+  m_impl->plays.SetOnMediaError(std::move(handler));
+}
+
+void MpvMediaPlayer::SetOnClockChange(std::function<void(const MediaClock&)> handler) {
+  m_impl->onClockChange = std::move(handler);
 }
 
 bool MpvMediaPlayer::HasVideoOutput() const {

@@ -3,7 +3,8 @@
 // sequences. OpenMedia replaces whatever plays and starts the file; the play
 // state goes to transitioning (9), then playing (3) once sound (or picture)
 // starts, and stopped (1) when the media has finished sounding, when Stop is
-// called, or when the file cannot be played. The position runs smoothly
+// called, or when the file cannot be played. Each change raised holds for
+// the play asked for last (MediaPlayState). The position runs smoothly
 // between mpv's reports (MediaClock).
 //
 // Threads: mpv runs its own threads, which touch nothing of ours but a
@@ -32,30 +33,16 @@
 #include <string>
 
 #include "platform/EventLoop.h"
+#include "platform/media/MediaClock.h"
+#include "platform/media/MpvOutputs.h"
 #include "ports/MessageLog.h"
 #include "show/MediaPlayer.h"
 
 namespace tav {
 
-class Settings;
-
-// The error number when mpv cannot be started at all.
-constexpr int32_t kMediaPlayerUnavailable = 429;
-
-struct MpvOutputs {
-  std::string audioOutput;  // mpv's "ao": "pulse", "alsa", "null"; empty: mpv's default
-  std::string audioDevice;  // mpv's "audio-device"; empty: the output's default
-  std::string videoOutput;  // mpv's "vo": "gpu", "drm", "null" (none); empty: mpv's default
-
-  static MpvOutputs FromSettings(const Settings& settings);
-};
-
 class MpvMediaPlayer : public MediaPlayer {
  public:
-  // The play state between OpenMedia and the start of playback.
-  static constexpr int32_t kTransitioning = 9;
-  // The error queue keeps the latest this many descriptions.
-  static constexpr size_t kMaxQueuedErrors = 100;
+  static constexpr int32_t kTransitioning = kMediaTransitioning;
 
   // Starts mpv with the given outputs. Fails with kMediaPlayerUnavailable
   // when mpv cannot be started.
@@ -80,6 +67,12 @@ class MpvMediaPlayer : public MediaPlayer {
 
   void SetOnPlayStateChange(std::function<void(int32_t newState)> handler) override;
   void SetOnMediaError(std::function<void()> handler) override;
+
+  // For the media process, which hands the position on to the player: called
+  // on the loop, from inside this player's handling of mpv's events, each
+  // time the position clock of the current play takes a report, starts, or
+  // learns the media's length. The handler must not call this player.
+  void SetOnClockChange(std::function<void(const MediaClock& clock)> handler);
 
   // Whether showing the video form can show anything.
   bool HasVideoOutput() const;

@@ -4,13 +4,12 @@
 
 #include <algorithm>
 #include <chrono>
-#include <cmath>
 #include <cstdint>
 #include <functional>
-#include <numbers>
 #include <string>
 #include <vector>
 
+#include "platform/media/testing/ToneWav.h"
 #include "ports/testing/RecordingMessageLog.h"
 #include "support/Error.h"
 #include "support/testing/TempFolder.h"
@@ -24,33 +23,6 @@ namespace tav {
 namespace {
 
 using namespace std::chrono_literals;
-
-// A mono 16-bit PCM WAV file of a 440 Hz tone.
-std::string ToneWav(double seconds) {
-  constexpr uint32_t kRate = 8000;
-  uint32_t samples = static_cast<uint32_t>(seconds * kRate);
-  std::string bytes;
-  auto put = [&bytes](uint32_t value, int size) {
-    for (int i = 0; i < size; ++i) bytes.push_back(static_cast<char>(value >> (8 * i)));
-  };
-  bytes += "RIFF";
-  put(36 + samples * 2, 4);
-  bytes += "WAVEfmt ";
-  put(16, 4);
-  put(1, 2);  // PCM
-  put(1, 2);  // mono
-  put(kRate, 4);
-  put(kRate * 2, 4);
-  put(2, 2);
-  put(16, 2);
-  bytes += "data";
-  put(samples * 2, 4);
-  for (uint32_t i = 0; i < samples; ++i) {
-    double wave = std::sin(2 * std::numbers::pi * 440.0 * i / kRate);
-    put(static_cast<uint16_t>(static_cast<int16_t>(8000 * wave)), 2);
-  }
-  return bytes;
-}
 
 class MpvMediaPlayerTest : public ::testing::Test {
  protected:
@@ -195,6 +167,36 @@ TEST_F(MpvMediaPlayerTest, OpeningAgainReplacesWhatPlaysAndPlaysTheNewFile) {
   EXPECT_GT(lastPositionPlaying, 0.4) << "the second play ended early";
   EXPECT_EQ(mediaErrors, 0) << "the replaced file's failure was reported";
   EXPECT_EQ(player->ErrorCount(), 0);
+}
+
+TEST_F(MpvMediaPlayerTest, AStateChangeOvertakenByStopOrOpenIsNotRaised) {
+  std::string tone = folder.Write("tone.wav", ToneWav(0.3));
+  Open(tone);
+  ASSERT_TRUE(RunUntil([&] { return Saw(kMediaPlaying); }));
+  player->Stop();  // its stopped state is overtaken before it is raised
+  Open(tone);
+  ASSERT_TRUE(RunUntil([&] { return states.size() >= 4 && states.back() == kMediaStopped; }));
+  // The media process tells the play each change concerns by when it is
+  // raised: a stale one would be reported against the newer play.
+  EXPECT_EQ(states,
+            (std::vector<int32_t>{MpvMediaPlayer::kTransitioning, kMediaPlaying,
+                                  MpvMediaPlayer::kTransitioning, kMediaPlaying, kMediaStopped}));
+}
+
+TEST_F(MpvMediaPlayerTest, TheClockIsHandedOnAsItChanges) {
+  std::vector<MediaClock::Snapshot> seen;
+  player->SetOnClockChange([&](const MediaClock& clock) { seen.push_back(clock.Take()); });
+  Open(folder.Write("tone.wav", ToneWav(0.5)));
+  ASSERT_TRUE(RunUntil([&] { return Saw(kMediaStopped); }));
+  ASSERT_GE(seen.size(), 3u);
+  EXPECT_NEAR(seen.front().end, 0.5, 0.01) << "the length comes first, before playing";
+  EXPECT_FALSE(seen.front().running);
+  EXPECT_TRUE(seen.back().running);
+  EXPECT_GT(seen.back().position, 0.0);
+  for (size_t i = 1; i < seen.size(); ++i) {
+    EXPECT_GE(seen[i].at, seen[i - 1].at);
+    EXPECT_GE(seen[i].position, seen[i - 1].position);
+  }
 }
 
 TEST_F(MpvMediaPlayerTest, AVideoIsVideoAndShowingItWithoutVideoOutputDoesNothing) {

@@ -27,7 +27,6 @@
 namespace tav {
 
 inline constexpr int32_t kMediaEnded = 8;
-inline constexpr int32_t kMediaTransitioning = 9;
 
 struct MediaScript {
   double durationSeconds = 60.0;
