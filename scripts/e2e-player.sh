@@ -122,10 +122,15 @@ grep -qE "^start +(.*/)?doorbell.tseq" "$work/monitor.log" || fail "no sequence-
 echo "e2e-player: the demo show plays and showctl trigger rang the doorbell"
 
 # The music plays in the media process, the one that maps libmpv; when it
-# dies the player says so and the show plays on.
+# dies the player says so and the show plays on. It is started by the first
+# music, so it may still be on its way.
 media=""
-for child in $(cat /proc/"$player_pid"/task/*/children 2>/dev/null); do
-  [ "$(cat "/proc/$child/comm" 2>/dev/null)" != showplayer-medi ] || media=$child  # comm: 15 bytes
+deadline=$((SECONDS + 10))
+while [ -z "$media" ] && [ $SECONDS -lt $deadline ]; do
+  for child in $(cat /proc/"$player_pid"/task/*/children 2>/dev/null); do
+    [ "$(cat "/proc/$child/comm" 2>/dev/null)" != showplayer-medi ] || media=$child  # comm: 15 bytes
+  done
+  [ -n "$media" ] || sleep 0.2
 done
 [ -n "$media" ] || fail "no media process (showplayer-media) beside the player"
 grep -q libmpv "/proc/$media/maps" || fail "the media process has no libmpv loaded"

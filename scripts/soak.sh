@@ -68,7 +68,9 @@ player_pid=$!
 
 # The player's resident memory and descriptors, and its media process's
 # resident memory (reported, not judged: it swings by some 30 MB with
-# whether music plays at the moment of the sample).
+# whether music plays at the moment of the sample, and is "-" when none runs:
+# the media process starts with the first music and ends after a minute
+# without any).
 sample() {
   local rss fds child media=-
   rss=$(awk '/^VmRSS:/ {print $2}' "/proc/$player_pid/status")

@@ -156,10 +156,11 @@ int RunPlayer(const PlayerOptions& options) {
   const std::shared_ptr<ChannelIOControl>& control = channelIO.Control();
 
   // The music and video play in the media process, beside this program (or
-  // as $TAV_MEDIA_HELPER says). Without it the shows go on without sound: it
-  // logs why, and each media file tries to start it again.
+  // as $TAV_MEDIA_HELPER says), started by the first media file and ended
+  // after the idle limit without one. Without it the shows go on without
+  // sound: it logs why, and each media file tries to start it again.
   MediaProcessPlayer media(loop, relay, MpvOutputs::FromSettings(settings),
-                           MediaProcessPlayer::DefaultProgramPath());
+                           MediaProcessPlayer::DefaultProgramPath(), MediaProcessTiming{});
 
   // Only the loop (timers, frames, the engine) runs at real-time priority;
   // media processes, started before or after, run at normal priority.

@@ -6,8 +6,11 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <cerrno>
 #include <chrono>
 #include <cstdint>
+#include <filesystem>
+#include <fstream>
 #include <functional>
 #include <string>
 #include <vector>
@@ -116,7 +119,57 @@ class MediaProcessTest : public ::testing::Test {
   int mediaErrors = 0;
 };
 
+// The children of this test program, of all its threads.
+std::vector<int64_t> Children() {
+  std::vector<int64_t> children;
+  for (const auto& task : std::filesystem::directory_iterator("/proc/self/task")) {
+    std::ifstream in(task.path() / "children");
+    for (int64_t child; in >> child;) children.push_back(child);
+  }
+  return children;
+}
+
+// Gone and reaped: a zombie would still take signal 0.
+bool Reaped(int64_t processId) {
+  return ::kill(static_cast<pid_t>(processId), 0) == -1 && errno == ESRCH;
+}
+
 // The real media process.
+
+TEST_F(MediaProcessTest, TheMediaProcessRunsFromTheFirstPlayUntilItHasBeenIdleForTheLimit) {
+  MediaProcessTiming timing;
+  timing.idleLimit = 200ms;
+  Make(TAV_MEDIA_PROGRAM, kNullOutputs, timing);
+  loop.RunFor(20ms);
+  EXPECT_EQ(player->ProcessId(), 0);
+  EXPECT_TRUE(Children().empty()) << "a process started before any media file";
+
+  // The tone outlasts the idle limit: a play is not idleness.
+  std::string tone = folder.Write("tone.wav", ToneWav(0.5));
+  int64_t before = 0;
+  for (int round = 0; round < 2; ++round) {
+    SCOPED_TRACE(round);
+    Forget();
+    Open(tone);  // queued while the new process loads libmpv
+    int64_t started = player->ProcessId();
+    EXPECT_NE(started, 0);
+    EXPECT_NE(started, before);
+    EXPECT_EQ(Children(), std::vector<int64_t>{started});
+    ASSERT_TRUE(RunUntil([&] { return Saw(kMediaStopped); }));
+    EXPECT_EQ(states, (std::vector<int32_t>{kTransitioning, kMediaPlaying, kMediaStopped}));
+    EXPECT_GT(positionSeen, 0.4);
+    EXPECT_EQ(player->ProcessId(), started) << "ended while playing";
+
+    auto stopped = SteadyClock::now();
+    ASSERT_TRUE(RunUntil([&] { return Reaped(started); }, 5s));
+    EXPECT_GE(SteadyClock::now() - stopped, 150ms) << "ended before the idle limit";
+    EXPECT_EQ(player->ProcessId(), 0);
+    EXPECT_TRUE(Children().empty());
+    EXPECT_EQ(mediaErrors, 0);
+    EXPECT_TRUE(log.lines.empty()) << "an idle end is not a failure";
+    before = started;
+  }
+}
 
 TEST_F(MediaProcessTest, PlaysAToneInTheMediaProcessAsMpvWould) {
   Make();
@@ -314,6 +367,25 @@ TEST_F(MediaProcessTest, ThePositionRunsOnFromTheMonotonicStampAndReportsOfOlder
   EXPECT_EQ(states, (std::vector<int32_t>{kTransitioning, kMediaPlaying}));
 }
 
+TEST_F(MediaProcessTest, OnlyAnUnbrokenStretchWithoutPlayEndsTheMediaProcess) {
+  MediaProcessTiming timing;
+  timing.idleLimit = 200ms;
+  Make(Fake("idle", "    open) say state $2 3 ;;\n    stop) ;;"), kNullOutputs, timing);
+  Open("/a.mp3");
+  int64_t first = player->ProcessId();
+  ASSERT_TRUE(RunUntil([&] { return Saw(kMediaPlaying); }));
+  player->Stop();
+  RunUntil([] { return false; }, 120ms);
+  Open("/b.mp3");  // within the limit: the same process plays it
+  RunUntil([] { return false; }, 150ms);
+  EXPECT_EQ(player->ProcessId(), first) << "the idle time before the play was counted";
+  player->Stop();
+  RunUntil([] { return false; }, 120ms);
+  EXPECT_EQ(player->ProcessId(), first) << "the idle time before the play was counted";
+  ASSERT_TRUE(RunUntil([&] { return Reaped(first); }, 5s));
+  EXPECT_TRUE(log.lines.empty());
+}
+
 TEST_F(MediaProcessTest, AMediaErrorCarriesItsQueueAndComesBeforeTheStoppedState) {
   Make(Fake("failing",
             "    open) say state $2 9; say error one%20reason; say error two\n"
@@ -394,14 +466,13 @@ TEST_F(MediaProcessTest, AMediaProcessThatDiesAtOnceIsStartedAgainOnlyAfterABack
   std::string died =
       "3 Media: the media process ended unexpectedly (exited with status 1); the next media file "
       "starts a new one";
-  ASSERT_TRUE(RunUntil([&] { return log.lines.size() == 1; }));  // while idle: no media error
-  EXPECT_EQ(mediaErrors, 0);
-
-  Open("/a.mp3");  // the second start follows at once
-  ASSERT_TRUE(RunUntil([&] { return mediaErrors == 1 && log.lines.size() == 2; }));
+  Open("/a.mp3");
+  ASSERT_TRUE(RunUntil([&] { return mediaErrors == 1 && log.lines.size() == 1; }));
+  Open("/b.mp3");  // the second start follows at once
+  ASSERT_TRUE(RunUntil([&] { return mediaErrors == 2 && log.lines.size() == 2; }));
   Open("/b.mp3");  // the third waits
-  ASSERT_TRUE(RunUntil([&] { return mediaErrors == 2; }));
-  EXPECT_EQ(player->ErrorDescription(1),
+  ASSERT_TRUE(RunUntil([&] { return mediaErrors == 3; }));
+  EXPECT_EQ(player->ErrorDescription(2),
             "Cannot play \"/b.mp3\": the media process keeps ending unexpectedly; it is tried "
             "again in 1 s" +
                 std::string(kSilent));
@@ -409,7 +480,7 @@ TEST_F(MediaProcessTest, AMediaProcessThatDiesAtOnceIsStartedAgainOnlyAfterABack
 
   RunUntil([] { return false; }, 450ms);
   Open("/c.mp3");
-  ASSERT_TRUE(RunUntil([&] { return mediaErrors == 3 && log.lines.size() == 3; }));
+  ASSERT_TRUE(RunUntil([&] { return mediaErrors == 4 && log.lines.size() == 3; }));
   EXPECT_EQ(folder.Read("starts"), "x\nx\nx\n");
   EXPECT_EQ(log.lines, (std::vector<std::string>{died, died, died}));
 }
@@ -417,21 +488,30 @@ TEST_F(MediaProcessTest, AMediaProcessThatDiesAtOnceIsStartedAgainOnlyAfterABack
 TEST_F(MediaProcessTest, WithoutItsProgramEachFilePlaysSilentlyUntilTheProgramIsThere) {
   std::string program = folder / "showplayer-media";
   Make(program);
-  EXPECT_EQ(log.lines, std::vector<std::string>{
-                           "3 Media: cannot start the media process " + program +
-                           ": No such file or directory; music and video play without sound "
-                           "until it starts, and each media file tries again"});
-  Forget();
-  Open("/a.mp3");
-  EXPECT_EQ(player->PlayState(), kMediaPlaying);
-  ASSERT_TRUE(RunUntil([&] { return player->CurrentPosition() > 0.05; }));
-  EXPECT_EQ(events, (std::vector<std::string>{"state 9", "error", "state 3"}));
-  ASSERT_EQ(player->ErrorCount(), 1);
-  EXPECT_EQ(player->ErrorDescription(0), "Cannot play \"/a.mp3\": cannot start the media process " +
-                                             program + ": No such file or directory" + kSilent);
-  EXPECT_TRUE(log.lines.empty()) << "said again for each file";
-  player->Stop();
-  EXPECT_EQ(player->CurrentPosition(), 0.0);
+  EXPECT_TRUE(log.lines.empty()) << "looked for before any media file";
+  for (std::string file : {"/a.mp3", "/b.mp3"}) {
+    SCOPED_TRACE(file);
+    Forget();
+    Open(file);
+    EXPECT_EQ(player->PlayState(), kMediaPlaying);
+    ASSERT_TRUE(RunUntil([&] { return player->CurrentPosition() > 0.05; }));
+    EXPECT_EQ(events, (std::vector<std::string>{"state 9", "error", "state 3"}));
+    ASSERT_EQ(player->ErrorCount(), 1);
+    EXPECT_EQ(player->ErrorDescription(0), "Cannot play \"" + file +
+                                               "\": cannot start the media process " + program +
+                                               ": No such file or directory" + kSilent);
+    player->Stop();
+    player->ClearErrorQueue();
+    EXPECT_EQ(player->CurrentPosition(), 0.0);
+    if (file == "/a.mp3") {
+      EXPECT_EQ(log.lines, std::vector<std::string>{
+                               "3 Media: cannot start the media process " + program +
+                               ": No such file or directory; music and video play without sound "
+                               "until it starts, and each media file tries again"});
+    } else {
+      EXPECT_TRUE(log.lines.empty()) << "said again for each file";
+    }
+  }
 
   Fake("showplayer-media", "    open) say state $2 3 ;;");
   Forget();

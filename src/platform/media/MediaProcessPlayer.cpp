@@ -11,10 +11,10 @@
 #include <cstring>
 #include <filesystem>
 #include <optional>
-#include <thread>
 #include <vector>
 
 #include "platform/media/ChildProcess.h"
+#include "platform/media/ChildReaper.h"
 #include "platform/media/MediaPlayState.h"
 #include "platform/media/MediaProtocol.h"
 #include "support/Error.h"
@@ -32,7 +32,6 @@ constexpr int kChildSocket = 3;
 // hung (a few thousand commands).
 constexpr size_t kMaxUnsent = 256 * 1024;
 constexpr size_t kReadChunk = 16 * 1024;
-constexpr auto kReapPoll = std::chrono::milliseconds(10);
 
 using SteadyClock = std::chrono::steady_clock;
 using Socket = asio::local::stream_protocol::socket;
@@ -77,14 +76,6 @@ struct MediaProcessPlayer::Impl : std::enable_shared_from_this<Impl> {
     uint64_t pingSerial = 0;
   };
 
-  // A media process on its way out, reaped on a timer.
-  struct Ending {
-    int64_t processId;
-    bool killed;
-    SteadyClock::time_point killAt;
-    std::string logWhenReaped;  // the log line's start; how it ended completes it
-  };
-
   Impl(EventLoop& loop, MessageLog& log, const MpvOutputs& outputs, std::string program,
        const MediaProcessTiming& timing)
       : loop(loop),
@@ -94,7 +85,8 @@ struct MediaProcessPlayer::Impl : std::enable_shared_from_this<Impl> {
         timing(timing),
         plays(loop, log, kSource),
         pingTimer(loop.Context()),
-        reapTimer(loop.Context()),
+        reaper(loop),
+        idleTimer(loop.Context()),
         silentEnd(loop.Context()) {}
 
   void Start();
@@ -108,8 +100,8 @@ struct MediaProcessPlayer::Impl : std::enable_shared_from_this<Impl> {
   void OnPingTimer();
   void EndLink(const std::string& why, bool kill, const std::string& playReason);
   void EndLinkUnexpectedly();
-  void ScheduleReap();
-  void Reap();
+  void QuitLink();
+  void WatchIdle();
   void Close();
 
   bool Current(uint64_t generation) const { return generation == plays.Generation(); }
@@ -126,10 +118,14 @@ struct MediaProcessPlayer::Impl : std::enable_shared_from_this<Impl> {
 
   std::shared_ptr<Link> link;
   asio::steady_timer pingTimer;
-  std::vector<Ending> ending;
-  asio::steady_timer reapTimer;
+  ChildReaper reaper;
   int earlyDeaths = 0;
   SteadyClock::time_point nextStartAllowed{};
+  // Whether the latest start failed and said so: said once until one works.
+  bool startFailureSaid = false;
+  // Since when a running media process has had nothing to play.
+  std::optional<SteadyClock::time_point> idleSince;
+  asio::steady_timer idleTimer;
 
   std::string path;
   std::string mediaType;
@@ -164,13 +160,12 @@ void MediaProcessPlayer::Impl::Start() {
   fresh->socket.assign(asio::local::stream_protocol(), child.socket, error);
   if (error) {
     ::close(child.socket);
-    KillChild(child.processId);
-    ending.push_back({child.processId, true, fresh->started, ""});
-    ScheduleReap();
+    reaper.Kill(child.processId);
     throw Error(errors::kInvalidProcedureCall, kSource,
                 "Cannot reach the media process: " + error.message());
   }
   link = std::move(fresh);
+  startFailureSaid = false;
   Send(media::Outputs{outputs.audioOutput, outputs.audioDevice, outputs.videoOutput});
   StartRead(link);
   SchedulePing();
@@ -230,6 +225,7 @@ void MediaProcessPlayer::Impl::OnReceived(const std::shared_ptr<Link>& on, size_
       return;
     }
     OnLine(line);
+    WatchIdle();
     if (link != on) return;  // the line ended it
   }
   StartRead(on);
@@ -344,14 +340,15 @@ void MediaProcessPlayer::Impl::EndLink(const std::string& why, bool kill,
 
   std::string line = "Media: the media process " + why;
   if (kill) {
-    KillChild(gone->processId);
+    reaper.Kill(gone->processId);
     log.LogMessage(3, line + kLogTail);
-    ending.push_back({gone->processId, true, now, ""});
   } else {
     // Said once it is known how it ended: at once, as a rule.
-    ending.push_back({gone->processId, false, now + timing.quitWait, line});
+    reaper.AwaitQuit(gone->processId, now + timing.quitWait, [&log = log, line](const auto& how) {
+      log.LogMessage(3, line + " (" + how + ")" + kLogTail);
+    });
   }
-  ScheduleReap();
+  WatchIdle();
   if (plays.State() != kMediaStopped) PlayOnInSilence(playReason);
 }
 
@@ -359,58 +356,54 @@ void MediaProcessPlayer::Impl::EndLinkUnexpectedly() {
   EndLink("ended unexpectedly", false, kEndedUnexpectedly);
 }
 
-void MediaProcessPlayer::Impl::ScheduleReap() {
-  Reap();
-  if (ending.empty()) return;
-  reapTimer.expires_after(kReapPoll);
-  reapTimer.async_wait([weak = weak_from_this()](const asio::error_code& error) {
-    auto self = weak.lock();
-    if (!error && self) self->ScheduleReap();
-  });
+// Ends the media process in order: it is told to quit (best effort and
+// without waiting; it also quits when the link closes), then reaped, and
+// killed if it has not gone within quitWait.
+void MediaProcessPlayer::Impl::QuitLink() {
+  if (!link) return;
+  std::shared_ptr<Link> gone = std::move(link);
+  pingTimer.cancel();
+  idleTimer.cancel();
+  idleSince.reset();
+  std::string quit = EncodeMediaMessage(media::Quit{});
+  [[maybe_unused]] auto sent =
+      ::send(gone->socket.native_handle(), quit.data(), quit.size(), MSG_NOSIGNAL | MSG_DONTWAIT);
+  asio::error_code ignored;
+  gone->socket.close(ignored);
+  reaper.AwaitQuit(gone->processId, SteadyClock::now() + timing.quitWait);
+  // It did not die: its life says nothing about the next one's.
+  earlyDeaths = 0;
 }
 
-void MediaProcessPlayer::Impl::Reap() {
-  auto now = SteadyClock::now();
-  std::erase_if(ending, [&](Ending& child) {
-    std::optional<std::string> how = TryReapChild(child.processId);
-    if (!how) {
-      if (!child.killed && now >= child.killAt) {
-        KillChild(child.processId);
-        child.killed = true;
-      }
-      return false;
-    }
-    if (!child.logWhenReaped.empty()) {
-      log.LogMessage(3, child.logWhenReaped + " (" + (how->empty() ? "already reaped" : *how) +
-                            ")" + kLogTail);
-    }
-    return true;
+// libmpv's memory is worth keeping only while music comes: a media process
+// that has had nothing to play for idleLimit is ended, and the next
+// OpenMedia starts a new one. Called wherever the play state or the link
+// may have changed.
+void MediaProcessPlayer::Impl::WatchIdle() {
+  if (!link || plays.State() != kMediaStopped) {
+    idleSince.reset();
+    idleTimer.cancel();
+    return;
+  }
+  if (idleSince) return;
+  idleSince = SteadyClock::now();
+  idleTimer.expires_after(timing.idleLimit);
+  idleTimer.async_wait([weak = weak_from_this(), on = link](const asio::error_code& error) {
+    auto self = weak.lock();
+    if (error || !self || self->link != on || !self->idleSince) return;
+    if (SteadyClock::now() - *self->idleSince < self->timing.idleLimit) return;  // re-armed since
+    self->idleSince.reset();
+    self->QuitLink();
   });
 }
 
 void MediaProcessPlayer::Impl::Close() {
-  pingTimer.cancel();
-  reapTimer.cancel();
+  idleTimer.cancel();
   silentEnd.cancel();
   plays.Silence();
-  auto now = SteadyClock::now();
-  if (link) {
-    // Best effort and without waiting: the media process also quits when
-    // the link closes.
-    std::string quit = EncodeMediaMessage(media::Quit{});
-    [[maybe_unused]] auto sent =
-        ::send(link->socket.native_handle(), quit.data(), quit.size(), MSG_NOSIGNAL | MSG_DONTWAIT);
-    asio::error_code ignored;
-    link->socket.close(ignored);
-    ending.push_back({link->processId, false, now + timing.quitWait, ""});
-    link.reset();
-  }
-  for (Ending& child : ending) child.logWhenReaped.clear();
+  QuitLink();
   // Closing is the one place that waits: the player is going.
-  while (!ending.empty()) {
-    Reap();
-    if (!ending.empty()) std::this_thread::sleep_for(std::chrono::milliseconds(2));
-  }
+  reaper.WaitForAll();
 }
 
 void MediaProcessPlayer::Impl::BeginNewPlay() {
@@ -458,17 +451,7 @@ double MediaProcessPlayer::Impl::Position(SteadyClock::time_point now) const {
 
 MediaProcessPlayer::MediaProcessPlayer(EventLoop& loop, MessageLog& log, const MpvOutputs& outputs,
                                        const std::string& program, const MediaProcessTiming& timing)
-    : m_impl(std::make_shared<Impl>(loop, log, outputs, program, timing)) {
-  try {
-    m_impl->Start();
-  } catch (const Error& e) {
-    // The lights need no media process: the shows go on, and each media
-    // file tries to start one again.
-    log.LogMessage(3, "Media: " + e.Description() +
-                          "; music and video play without sound until it starts, and each "
-                          "media file tries again");
-  }
-}
+    : m_impl(std::make_shared<Impl>(loop, log, outputs, program, timing)) {}
 
 MediaProcessPlayer::~MediaProcessPlayer() {
   m_impl->Close();
@@ -491,11 +474,22 @@ void MediaProcessPlayer::OpenMedia(const std::string& path) {
     try {
       p.Start();
     } catch (const Error& e) {
+      // The lights need no media process: the shows go on, and each media
+      // file tries to start one again. Said once until one starts.
+      if (!p.startFailureSaid) {
+        p.log.LogMessage(3, "Media: " + e.Description() +
+                                "; music and video play without sound until it starts, and each "
+                                "media file tries again");
+        p.startFailureSaid = true;
+      }
       p.PlayOnInSilence(e.Description());
       return;
     }
   }
+  // Sent at once: while a new media process starts, the socket holds it
+  // until the media process reads it.
   p.Send(media::Open{p.plays.Generation(), path});
+  p.WatchIdle();
 }
 
 void MediaProcessPlayer::Stop() {
@@ -503,6 +497,7 @@ void MediaProcessPlayer::Stop() {
   p.BeginNewPlay();
   p.Send(media::Stop{p.plays.Generation()});
   p.plays.SetState(kMediaStopped);
+  p.WatchIdle();
 }
 
 std::string MediaProcessPlayer::CurrentMediaItemInfo(const std::string& attribute) const {

@@ -17,8 +17,12 @@
 // object; each change raised holds for the play asked for last
 // (MediaPlayState).
 //
-// The media process is started with this object (posix_spawn: the loop does
-// not wait for it) and pinged every MediaProcessTiming::pingInterval. When it
+// The media process is started by the first OpenMedia (posix_spawn: the
+// loop does not wait for it; the play waits in the link until the media
+// process reads it, transitioning meanwhile) and ended in order (quit, then
+// reaped) once nothing has played for MediaProcessTiming::idleLimit, so
+// that an idle player does not hold libmpv's memory; the next OpenMedia
+// starts a new one. While it runs it is pinged every pingInterval. When it
 // ends, writes what cannot be read, or leaves a ping unanswered for
 // answerBound, it is ended and one line is logged. The music is lost, not
 // the show: a play that was going plays on without sound, its position
@@ -62,8 +66,11 @@ struct MediaProcessTiming {
   // each further one, up to maxBackOff.
   std::chrono::milliseconds firstBackOff{1000};
   std::chrono::milliseconds maxBackOff{60000};
-  // How long the destructor waits for the media process to quit.
+  // How long a media process that is told to quit (when idle, or by the
+  // destructor) may take before it is killed.
   std::chrono::milliseconds quitWait{1000};
+  // How long a media process may have nothing to play before it is ended.
+  std::chrono::milliseconds idleLimit{60000};
 };
 
 class MediaProcessPlayer : public MediaPlayer {
@@ -75,9 +82,10 @@ class MediaProcessPlayer : public MediaPlayer {
   static constexpr const char* kProgramName = "showplayer-media";
   static std::string DefaultProgramPath();
 
-  // Starts the media process `program` with the given outputs. A program
-  // that is missing or cannot start is logged, not raised: each OpenMedia
-  // tries again.
+  // Plays through the media process `program` with the given outputs, which
+  // starts at the first OpenMedia. A program that is missing or cannot start
+  // is logged (once until one starts), not raised: each OpenMedia tries
+  // again.
   MediaProcessPlayer(EventLoop& loop, MessageLog& log, const MpvOutputs& outputs,
                      const std::string& program, const MediaProcessTiming& timing = {});
   ~MediaProcessPlayer() override;
