@@ -1,21 +1,13 @@
 #include "platform/media/MediaProcessPlayer.h"
 
-#include <sys/socket.h>
-#include <unistd.h>
-
 #include <algorithm>
-#include <array>
 #include <asio.hpp>
-#include <cerrno>
 #include <cstdlib>
-#include <cstring>
 #include <filesystem>
 #include <optional>
-#include <vector>
 
-#include "platform/media/ChildProcess.h"
-#include "platform/media/ChildReaper.h"
 #include "platform/media/MediaPlayState.h"
+#include "platform/media/MediaProcessLink.h"
 #include "platform/media/MediaProtocol.h"
 #include "support/Error.h"
 
@@ -23,27 +15,16 @@ namespace tav {
 namespace {
 
 constexpr const char* kSource = "MediaProcessPlayer";
-constexpr const char* kEndedUnexpectedly = "the media process ended unexpectedly";
-constexpr const char* kLogTail = "; the next media file starts a new one";
 constexpr const char* kSilentTail = "; playing on without sound";
-// The media process's end of the socket pair, as its command line says.
-constexpr int kChildSocket = 3;
-// What may wait for a media process that does not read before it counts as
-// hung (a few thousand commands).
-constexpr size_t kMaxUnsent = 256 * 1024;
-constexpr size_t kReadChunk = 16 * 1024;
 
 using SteadyClock = std::chrono::steady_clock;
-using Socket = asio::local::stream_protocol::socket;
 
 SteadyClock::duration Seconds(double seconds) {
   return std::chrono::duration_cast<SteadyClock::duration>(std::chrono::duration<double>(seconds));
 }
 
-std::string DurationText(SteadyClock::duration duration) {
-  auto ms = std::chrono::duration_cast<std::chrono::milliseconds>(duration).count();
-  if (ms % 1000 == 0) return std::to_string(ms / 1000) + " s";
-  return std::to_string(ms) + " ms";
+MediaProcessLink::Timing LinkTiming(const MediaProcessTiming& timing) {
+  return {timing.pingInterval, timing.answerBound, timing.quitWait};
 }
 
 }  // namespace
@@ -58,48 +39,19 @@ std::string MediaProcessPlayer::DefaultProgramPath() {
 }
 
 struct MediaProcessPlayer::Impl : std::enable_shared_from_this<Impl> {
-  // One running media process and the link to it. Shared with the pending
-  // reads and writes, which keep their buffers alive until they complete.
-  struct Link {
-    explicit Link(asio::io_context& context) : socket(context) {}
-    int64_t processId = 0;
-    SteadyClock::time_point started;
-    Socket socket;
-    std::array<char, kReadChunk> received{};
-    MediaLineReader lines;
-    std::string unsent;
-    std::string sending;
-    bool greeted = false;
-    // Awaiting the greeting, or the answer to ping `pingSerial`, since then.
-    bool awaiting = true;
-    SteadyClock::time_point awaitingSince;
-    uint64_t pingSerial = 0;
-  };
-
   Impl(EventLoop& loop, MessageLog& log, const MpvOutputs& outputs, std::string program,
        const MediaProcessTiming& timing)
-      : loop(loop),
-        log(log),
-        outputs(outputs),
-        program(std::move(program)),
+      : log(log),
         timing(timing),
         plays(loop, log, kSource),
-        pingTimer(loop.Context()),
-        reaper(loop),
+        link(loop, log, outputs, std::move(program), LinkTiming(timing)),
         idleTimer(loop.Context()),
         silentEnd(loop.Context()) {}
 
-  void Start();
-  void Send(const MediaMessage& message);
-  void StartWrite(const std::shared_ptr<Link>& on);
-  void StartRead(const std::shared_ptr<Link>& on);
-  void OnReceived(const std::shared_ptr<Link>& on, size_t size);
-  void OnLine(const std::string& line);
+  // Called once the Impl is shared: the link's handlers hold it weakly.
+  void ListenToLink();
   void Handle(const MediaMessage& message);
-  void SchedulePing();
-  void OnPingTimer();
-  void EndLink(const std::string& why, bool kill, const std::string& playReason);
-  void EndLinkUnexpectedly();
+  void OnLinkEnded(const std::string& reason, SteadyClock::duration lived);
   void QuitLink();
   void WatchIdle();
   void Close();
@@ -109,16 +61,11 @@ struct MediaProcessPlayer::Impl : std::enable_shared_from_this<Impl> {
   void PlayOnInSilence(const std::string& reason);
   double Position(SteadyClock::time_point now) const;
 
-  EventLoop& loop;
   MessageLog& log;
-  MpvOutputs outputs;
-  std::string program;
   MediaProcessTiming timing;
   MediaPlayState plays;
 
-  std::shared_ptr<Link> link;
-  asio::steady_timer pingTimer;
-  ChildReaper reaper;
+  MediaProcessLink link;
   int earlyDeaths = 0;
   SteadyClock::time_point nextStartAllowed{};
   // Whether the latest start failed and said so: said once until one works.
@@ -144,125 +91,20 @@ struct MediaProcessPlayer::Impl : std::enable_shared_from_this<Impl> {
   asio::steady_timer silentEnd;
 };
 
-// Spawning returns at once: the media process loads libmpv on its own time.
-void MediaProcessPlayer::Impl::Start() {
-  if (::access(program.c_str(), X_OK) != 0) {
-    std::string reason = std::strerror(errno);
-    throw Error(kMediaPlayerUnavailable, kSource,
-                "cannot start the media process " + program + ": " + reason);
-  }
-  SpawnedChild child =
-      SpawnWithSocket(program, {"--fd", std::to_string(kChildSocket)}, kChildSocket);
-  auto fresh = std::make_shared<Link>(loop.Context());
-  fresh->processId = child.processId;
-  fresh->started = fresh->awaitingSince = SteadyClock::now();
-  asio::error_code error;
-  fresh->socket.assign(asio::local::stream_protocol(), child.socket, error);
-  if (error) {
-    ::close(child.socket);
-    reaper.Kill(child.processId);
-    throw Error(errors::kInvalidProcedureCall, kSource,
-                "Cannot reach the media process: " + error.message());
-  }
-  link = std::move(fresh);
-  startFailureSaid = false;
-  Send(media::Outputs{outputs.audioOutput, outputs.audioDevice, outputs.videoOutput});
-  StartRead(link);
-  SchedulePing();
-}
-
-void MediaProcessPlayer::Impl::Send(const MediaMessage& message) {
-  if (!link) return;
-  link->unsent += EncodeMediaMessage(message);
-  if (link->unsent.size() > kMaxUnsent) {
-    EndLink("stopped reading and was ended", true, kEndedUnexpectedly);
-    return;
-  }
-  StartWrite(link);
-}
-
-void MediaProcessPlayer::Impl::StartWrite(const std::shared_ptr<Link>& on) {
-  if (!on->sending.empty() || on->unsent.empty()) return;
-  on->sending.swap(on->unsent);
-  // The socket is written with send(MSG_NOSIGNAL): a media process that has
-  // gone raises no SIGPIPE here, only an error.
-  asio::async_write(on->socket, asio::buffer(on->sending),
-                    [weak = weak_from_this(), on](const asio::error_code& error, size_t) {
-                      auto self = weak.lock();
-                      if (!self || self->link != on) return;
-                      on->sending.clear();
-                      if (error) {
-                        self->EndLinkUnexpectedly();
-                        return;
-                      }
-                      self->StartWrite(on);
-                    });
-}
-
-void MediaProcessPlayer::Impl::StartRead(const std::shared_ptr<Link>& on) {
-  on->socket.async_read_some(
-      asio::buffer(on->received),
-      [weak = weak_from_this(), on](const asio::error_code& error, size_t size) {
-        auto self = weak.lock();
-        if (!self || self->link != on) return;
-        if (error) {
-          self->EndLinkUnexpectedly();
-          return;
-        }
-        self->OnReceived(on, size);
-      });
-}
-
-void MediaProcessPlayer::Impl::OnReceived(const std::shared_ptr<Link>& on, size_t size) {
-  on->lines.Append(std::string_view(on->received.data(), size));
-  std::string line;
-  for (;;) {
-    MediaLineStatus status = on->lines.Next(line);
-    if (status == MediaLineStatus::kIncomplete) break;
-    if (status == MediaLineStatus::kTooLong) {
-      EndLink("sent a line longer than " + std::to_string(kMaxMediaLine) + " bytes and was ended",
-              true, kEndedUnexpectedly);
-      return;
+void MediaProcessPlayer::Impl::ListenToLink() {
+  link.SetOnMessage([weak = weak_from_this()](const MediaMessage& message) {
+    if (auto self = weak.lock()) {
+      self->Handle(message);
+      self->WatchIdle();
     }
-    OnLine(line);
-    WatchIdle();
-    if (link != on) return;  // the line ended it
-  }
-  StartRead(on);
-}
-
-void MediaProcessPlayer::Impl::OnLine(const std::string& line) {
-  MediaMessage message;
-  try {
-    message = DecodeMediaLine(line);
-  } catch (const Error& e) {
-    EndLink("sent what cannot be read (" + e.Description() + ") and was ended", true,
-            kEndedUnexpectedly);
-    return;
-  }
-  bool isHello = std::holds_alternative<media::Hello>(message);
-  if (isHello == link->greeted) {
-    EndLink(std::string("sent \"") + MediaMessageName(message) +
-                (isHello ? "\" twice" : "\" before its greeting") + " and was ended",
-            true, kEndedUnexpectedly);
-    return;
-  }
-  Handle(message);
+  });
+  link.SetOnEnded([weak = weak_from_this()](const std::string& reason, auto lived) {
+    if (auto self = weak.lock()) self->OnLinkEnded(reason, lived);
+  });
 }
 
 void MediaProcessPlayer::Impl::Handle(const MediaMessage& message) {
-  if (const auto* hello = std::get_if<media::Hello>(&message)) {
-    if (hello->version != kMediaProtocolVersion) {
-      EndLink("speaks version " + std::to_string(hello->version) + " of the protocol, not " +
-                  std::to_string(kMediaProtocolVersion),
-              true, kEndedUnexpectedly);
-      return;
-    }
-    link->greeted = true;
-    link->awaiting = false;
-  } else if (const auto* pong = std::get_if<media::Pong>(&message)) {
-    if (pong->serial == link->pingSerial) link->awaiting = false;
-  } else if (const auto* report = std::get_if<media::State>(&message)) {
+  if (const auto* report = std::get_if<media::State>(&message)) {
     if (!Current(report->generation)) return;
     if (report->state == kMediaStopped) clock.Reset();
     plays.SetState(report->state);
@@ -282,95 +124,29 @@ void MediaProcessPlayer::Impl::Handle(const MediaMessage& message) {
     bool current = Current(failure->generation);
     if (current && failure->state == kMediaStopped) clock.Reset();
     plays.RaiseError(current ? failure->state : plays.State());
-  } else if (const auto* line = std::get_if<media::Log>(&message)) {
-    log.LogMessage(line->level, line->text);
-  } else if (const auto* failed = std::get_if<media::Failed>(&message)) {
-    EndLink("cannot play: " + failed->description, true, failed->description);
-  } else {
-    EndLink(std::string("sent a command (\"") + MediaMessageName(message) + "\") and was ended",
-            true, kEndedUnexpectedly);
   }
 }
 
-void MediaProcessPlayer::Impl::SchedulePing() {
-  pingTimer.expires_after(timing.pingInterval);
-  pingTimer.async_wait([weak = weak_from_this(), on = link](const asio::error_code& error) {
-    auto self = weak.lock();
-    if (error || !self || self->link != on) return;
-    self->OnPingTimer();
-  });
-}
-
-void MediaProcessPlayer::Impl::OnPingTimer() {
-  auto now = SteadyClock::now();
-  if (link->awaiting) {
-    if (now - link->awaitingSince >= timing.answerBound) {
-      EndLink(std::string(link->greeted ? "did not answer" : "did not start") + " within " +
-                  DurationText(timing.answerBound) + " and was ended",
-              true, kEndedUnexpectedly);
-      return;
-    }
-  } else {
-    link->awaiting = true;
-    link->awaitingSince = now;
-    Send(media::Ping{++link->pingSerial});
-    if (!link) return;
-  }
-  SchedulePing();
-}
-
-// One line in the log for each media process that ends; a play that was
-// going ends with a media error. `why` completes "the media process ...".
-void MediaProcessPlayer::Impl::EndLink(const std::string& why, bool kill,
-                                       const std::string& playReason) {
-  if (!link) return;
-  std::shared_ptr<Link> gone = std::move(link);
-  asio::error_code ignored;
-  gone->socket.close(ignored);
-  pingTimer.cancel();
-
-  auto now = SteadyClock::now();
-  earlyDeaths = now - gone->started < timing.stableLife ? earlyDeaths + 1 : 1;
+// A media process that dies young counts towards the back-off; a play that
+// was going ends with a media error and plays on without sound.
+void MediaProcessPlayer::Impl::OnLinkEnded(const std::string& reason, SteadyClock::duration lived) {
+  earlyDeaths = lived < timing.stableLife ? earlyDeaths + 1 : 1;
   auto backOff = SteadyClock::duration::zero();
   if (earlyDeaths >= 2) {
     backOff = timing.firstBackOff * (int64_t{1} << std::min(earlyDeaths - 2, 20));
     backOff = std::min<SteadyClock::duration>(backOff, timing.maxBackOff);
   }
-  nextStartAllowed = now + backOff;
-
-  std::string line = "Media: the media process " + why;
-  if (kill) {
-    reaper.Kill(gone->processId);
-    log.LogMessage(3, line + kLogTail);
-  } else {
-    // Said once it is known how it ended: at once, as a rule.
-    reaper.AwaitQuit(gone->processId, now + timing.quitWait, [&log = log, line](const auto& how) {
-      log.LogMessage(3, line + " (" + how + ")" + kLogTail);
-    });
-  }
+  nextStartAllowed = SteadyClock::now() + backOff;
   WatchIdle();
-  if (plays.State() != kMediaStopped) PlayOnInSilence(playReason);
+  if (plays.State() != kMediaStopped) PlayOnInSilence(reason);
 }
 
-void MediaProcessPlayer::Impl::EndLinkUnexpectedly() {
-  EndLink("ended unexpectedly", false, kEndedUnexpectedly);
-}
-
-// Ends the media process in order: it is told to quit (best effort and
-// without waiting; it also quits when the link closes), then reaped, and
-// killed if it has not gone within quitWait.
+// Ends the media process in order (see MediaProcessLink::Quit).
 void MediaProcessPlayer::Impl::QuitLink() {
-  if (!link) return;
-  std::shared_ptr<Link> gone = std::move(link);
-  pingTimer.cancel();
+  if (!link.Running()) return;
   idleTimer.cancel();
   idleSince.reset();
-  std::string quit = EncodeMediaMessage(media::Quit{});
-  [[maybe_unused]] auto sent =
-      ::send(gone->socket.native_handle(), quit.data(), quit.size(), MSG_NOSIGNAL | MSG_DONTWAIT);
-  asio::error_code ignored;
-  gone->socket.close(ignored);
-  reaper.AwaitQuit(gone->processId, SteadyClock::now() + timing.quitWait);
+  link.Quit();
   // It did not die: its life says nothing about the next one's.
   earlyDeaths = 0;
 }
@@ -380,7 +156,7 @@ void MediaProcessPlayer::Impl::QuitLink() {
 // OpenMedia starts a new one. Called wherever the play state or the link
 // may have changed.
 void MediaProcessPlayer::Impl::WatchIdle() {
-  if (!link || plays.State() != kMediaStopped) {
+  if (!link.Running() || plays.State() != kMediaStopped) {
     idleSince.reset();
     idleTimer.cancel();
     return;
@@ -388,13 +164,15 @@ void MediaProcessPlayer::Impl::WatchIdle() {
   if (idleSince) return;
   idleSince = SteadyClock::now();
   idleTimer.expires_after(timing.idleLimit);
-  idleTimer.async_wait([weak = weak_from_this(), on = link](const asio::error_code& error) {
-    auto self = weak.lock();
-    if (error || !self || self->link != on || !self->idleSince) return;
-    if (SteadyClock::now() - *self->idleSince < self->timing.idleLimit) return;  // re-armed since
-    self->idleSince.reset();
-    self->QuitLink();
-  });
+  idleTimer.async_wait(
+      [weak = weak_from_this(), on = link.ProcessId()](const asio::error_code& error) {
+        auto self = weak.lock();
+        if (error || !self || self->link.ProcessId() != on || !self->idleSince) return;
+        if (SteadyClock::now() - *self->idleSince < self->timing.idleLimit)
+          return;  // re-armed since
+        self->idleSince.reset();
+        self->QuitLink();
+      });
 }
 
 void MediaProcessPlayer::Impl::Close() {
@@ -402,8 +180,7 @@ void MediaProcessPlayer::Impl::Close() {
   silentEnd.cancel();
   plays.Silence();
   QuitLink();
-  // Closing is the one place that waits: the player is going.
-  reaper.WaitForAll();
+  link.Close();
 }
 
 void MediaProcessPlayer::Impl::BeginNewPlay() {
@@ -451,7 +228,9 @@ double MediaProcessPlayer::Impl::Position(SteadyClock::time_point now) const {
 
 MediaProcessPlayer::MediaProcessPlayer(EventLoop& loop, MessageLog& log, const MpvOutputs& outputs,
                                        const std::string& program, const MediaProcessTiming& timing)
-    : m_impl(std::make_shared<Impl>(loop, log, outputs, program, timing)) {}
+    : m_impl(std::make_shared<Impl>(loop, log, outputs, program, timing)) {
+  m_impl->ListenToLink();
+}
 
 MediaProcessPlayer::~MediaProcessPlayer() {
   m_impl->Close();
@@ -463,16 +242,17 @@ void MediaProcessPlayer::OpenMedia(const std::string& path) {
   p.path = path;
   p.mediaType.clear();
   p.plays.SetState(kTransitioning);
-  if (!p.link) {
+  if (!p.link.Running()) {
     auto now = SteadyClock::now();
     if (now < p.nextStartAllowed) {
-      p.PlayOnInSilence(
-          "the media process keeps ending unexpectedly; it is tried again in " +
-          DurationText(std::chrono::ceil<std::chrono::seconds>(p.nextStartAllowed - now)));
+      p.PlayOnInSilence("the media process keeps ending unexpectedly; it is tried again in " +
+                        MediaProcessLink::DurationText(
+                            std::chrono::ceil<std::chrono::seconds>(p.nextStartAllowed - now)));
       return;
     }
     try {
-      p.Start();
+      p.link.Start();
+      p.startFailureSaid = false;
     } catch (const Error& e) {
       // The lights need no media process: the shows go on, and each media
       // file tries to start one again. Said once until one starts.
@@ -488,14 +268,14 @@ void MediaProcessPlayer::OpenMedia(const std::string& path) {
   }
   // Sent at once: while a new media process starts, the socket holds it
   // until the media process reads it.
-  p.Send(media::Open{p.plays.Generation(), path});
+  p.link.Send(media::Open{p.plays.Generation(), path});
   p.WatchIdle();
 }
 
 void MediaProcessPlayer::Stop() {
   Impl& p = *m_impl;
   p.BeginNewPlay();
-  p.Send(media::Stop{p.plays.Generation()});
+  p.link.Send(media::Stop{p.plays.Generation()});
   p.plays.SetState(kMediaStopped);
   p.WatchIdle();
 }
@@ -515,7 +295,7 @@ int32_t MediaProcessPlayer::PlayState() const {
 }
 
 void MediaProcessPlayer::SetFullScreen(bool value) {
-  m_impl->Send(media::FullScreen{value});
+  m_impl->link.Send(media::FullScreen{value});
 }
 
 int32_t MediaProcessPlayer::ErrorCount() const {
@@ -531,11 +311,11 @@ void MediaProcessPlayer::ClearErrorQueue() {
 }
 
 void MediaProcessPlayer::ShowVideoForm(int32_t x, int32_t y) {
-  m_impl->Send(media::ShowVideo{x, y});
+  m_impl->link.Send(media::ShowVideo{x, y});
 }
 
 void MediaProcessPlayer::HideVideoForm() {
-  m_impl->Send(media::HideVideo{});
+  m_impl->link.Send(media::HideVideo{});
 }
 
 void MediaProcessPlayer::SetOnPlayStateChange(std::function<void(int32_t)> handler) {
@@ -547,7 +327,7 @@ void MediaProcessPlayer::SetOnMediaError(std::function<void()> handler) {
 }
 
 int64_t MediaProcessPlayer::ProcessId() const {
-  return m_impl->link ? m_impl->link->processId : 0;
+  return m_impl->link.ProcessId();
 }
 
 MediaProcessPlayer::PositionReport MediaProcessPlayer::LatestReport() const {
