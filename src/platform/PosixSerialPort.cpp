@@ -270,8 +270,16 @@ void LinkCore::FlushBeforeClose(std::chrono::milliseconds limit) {
   while (!queue.empty() && SteadyClock::now() < deadline) {
     Chunk& chunk = queue.front();
     if (chunk.breakMicros > 0) {
+      // The break must not cut into the bytes before it; tcdrain could wait
+      // for ever on a stalled device, so the driver's queue is watched instead.
       std::this_thread::sleep_until(std::min(lineFreeAt, deadline));
-      ::tcdrain(Fd());
+      int pending = 0;
+      while (::ioctl(Fd(), TIOCOUTQ, &pending) == 0 && pending > 0 &&
+             SteadyClock::now() < deadline) {
+        std::this_thread::sleep_for(std::chrono::microseconds(
+            SerialLineMicros(static_cast<size_t>(pending), settings.baud, settings.stopBits)));
+      }
+      if (SteadyClock::now() >= deadline) return;
       ::ioctl(Fd(), TIOCSBRK);
       std::this_thread::sleep_for(std::chrono::microseconds(chunk.breakMicros));
       ::ioctl(Fd(), TIOCCBRK);
